@@ -1,0 +1,12 @@
+#pragma once
+
+#include "imagelib/ImageLibExport.h"
+
+// Debug output. Silent unless VARNOTH_TRACE=1 (lines then go to standard error) or a host
+// installs its own sink. Formats are wide printf formats ("%d", "%f", "%s" for narrow text
+// is written "%hs").
+using TraceHandler = void (*)(const wchar_t* line);
+
+CIMAGE_API void Trace(const wchar_t* format, ...);
+// Installs a sink for every trace line and returns the previous one; null restores the default.
+CIMAGE_API TraceHandler SetTraceHandler(TraceHandler handler);

@@ -1,0 +1,3 @@
+#include "varnoth/Commands.h"
+
+void RegisterCodingCommands(CLI::App&) {}
