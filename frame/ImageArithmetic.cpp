@@ -118,7 +118,7 @@ void ImageStretch(CImage& img, int, int) {
             maximum = std::max<int>(maximum, row[i]);
         }
     }
-    // An empty window leaves minimum above maximum: nothing to stretch by.
+    // A flat window has no range to stretch by.
     if (maximum - minimum <= 0) return;
     unsigned char table[256];
     for (int v = 0; v < 256; ++v) {

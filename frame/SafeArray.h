@@ -25,7 +25,7 @@ public:
         try {
             m_data = new T[count > 0 ? count : 1]();
         } catch (const std::bad_alloc& failure) {
-            Trace(L"CSafeArray::init: allocation failed. Error %.500hs\n", failure.what());
+            Trace(L"CSafeArray::init: allocation failed. Error %.500s\n", failure.what());
             throw CSafeArrayErrorT();
         }
         m_count = count;

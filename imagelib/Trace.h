@@ -3,8 +3,8 @@
 #include "imagelib/ImageLibExport.h"
 
 // Debug output. Silent unless VARNOTH_TRACE=1 (lines then go to standard error) or a host
-// installs its own sink. Formats are wide printf formats ("%d", "%f", "%s" for narrow text
-// is written "%hs").
+// installs its own sink. Formats are wide printf formats: "%s" takes a narrow string and
+// "%ls" a wide one.
 using TraceHandler = void (*)(const wchar_t* line);
 
 CIMAGE_API void Trace(const wchar_t* format, ...);

@@ -1,0 +1,30 @@
+#pragma once
+
+#include <cstdint>
+#include <random>
+
+#include "imagelib/CImage.h"
+
+// Small helpers shared by the test programs.
+namespace testing_images {
+
+// An image of the given geometry filled with random bytes, row padding included.
+inline CImage RandomImage(int w, int h, int bits, uint32_t seed) {
+    CImage img(w, h, bits);
+    std::mt19937 rng(seed);
+    for (size_t i = 0; i < img.GetSize(); ++i) img.GetBits()[i] = static_cast<unsigned char>(rng());
+    return img;
+}
+
+// True when both images have the same geometry and the same pixel bytes (padding ignored).
+inline bool SamePixels(const CImage& a, const CImage& b) {
+    if (a.GetWidth() != b.GetWidth() || a.GetHeight() != b.GetHeight() || a.GetBitCount() != b.GetBitCount())
+        return false;
+    const size_t rowBytes = static_cast<size_t>(a.GetWidth()) * (a.GetBitCount() / 8);
+    for (int y = 0; y < a.GetHeight(); ++y)
+        for (size_t i = 0; i < rowBytes; ++i)
+            if (a.GetPtrXY(0, y)[i] != b.GetPtrXY(0, y)[i]) return false;
+    return true;
+}
+
+}  // namespace testing_images
