@@ -1,0 +1,162 @@
+// Window grading: how well 5 x 5 windows of a channel plane match the reference plane around
+// each sampled stroke point, at every offset within +-10 pixels.
+
+#include <algorithm>
+#include <cmath>
+
+#include "channels/CheatIR.h"
+#include "channels/CheatIRInternal.h"
+#include "imagelib/DumpPath.h"
+
+namespace {
+
+constexpr int kWindowSide = 5;
+constexpr int kWindowHalf = kWindowSide / 2;
+constexpr int kWindowSize = kWindowSide * kWindowSide;
+constexpr int kSearch = SSegmentGrades::kRadius;
+constexpr int kMapSide = SSegmentGrades::kSide;
+constexpr int kMapSize = SSegmentGrades::kEntries;
+// Window centres stay this far inside the channel, so every graded window is whole.
+constexpr int kCentreMargin = kWindowHalf;
+
+// A point's search square is clipped by the border: its grades are packed, not placed.
+bool SearchClipped(const CPoint& p, int width, int height) {
+    const int reach = kSearch + kCentreMargin;
+    return p.x < reach || p.y < reach || p.x > width - 1 - reach || p.y > height - 1 - reach;
+}
+
+// Grades 0..2 (or accumulated ones scaled by `scale`) as bytes, limited to 255, truncated.
+void DumpMap(const float* entries, float scale, bool divide, const wchar_t* path) {
+    CImage picture(kMapSide, kMapSide, 8);
+    for (int i = 0; i < kMapSide; ++i) {
+        uint8_t* row = picture.GetPtrXY(0, i);
+        for (int j = 0; j < kMapSide; ++j) {
+            const float v = divide ? entries[kMapSide * i + j] / scale * 255.0f : entries[kMapSide * i + j] * 255.0f;
+            row[j] = v > 255.0f ? 255 : static_cast<uint8_t>(static_cast<int>(v));
+        }
+    }
+    picture.ExportFile(path);
+}
+
+void DumpWindow(const uint8_t* window) {
+    CImage picture(kWindowSide, kWindowSide, 8);
+    for (int i = 0; i < kWindowSide; ++i) {
+        std::copy(window + kWindowSide * i, window + kWindowSide * (i + 1), picture.GetPtrXY(0, i));
+    }
+    picture.ExportFile(L"\\results\\baseMap.bmp");
+}
+
+}  // namespace
+
+namespace channels {
+
+// The order of every float operation below is what fixes the grade; the reference's mean and
+// centred values come out the same whether worked out once or per call.
+ReferenceStats MakeReferenceStats(const uint8_t* window) {
+    ReferenceStats stats{};
+    float sum = 0.0f;
+    for (int i = 0; i < kWindowSize; ++i) sum += static_cast<float>(window[i]);
+    const float mean = sum / static_cast<float>(kWindowSize);
+    float squares = 0.0f;
+    for (int i = 0; i < kWindowSize; ++i) {
+        stats.centred[i] = static_cast<float>(window[i]) - mean;
+        squares += stats.centred[i] * stats.centred[i];
+    }
+    stats.sumSquares = squares;
+    return stats;
+}
+
+float GradeAgainst(const uint8_t* window, const ReferenceStats& ref) {
+    const ReferenceStats own = MakeReferenceStats(window);
+    float cross = 0.0f;
+    for (int i = 0; i < kWindowSize; ++i) cross += own.centred[i] * ref.centred[i];
+    const float g = 1.0f - cross / std::sqrt(own.sumSquares * ref.sumSquares);
+    // A uniform window makes the quotient NaN, which fails the test and grades 0.
+    return g > 0.0f ? g : 0.0f;
+}
+
+float GradeWindows(const uint8_t* a, const uint8_t* b) { return GradeAgainst(a, MakeReferenceStats(b)); }
+
+}  // namespace channels
+
+void CCheatIR::BuildBaseWin(const CPoint& point, const CImage& image, Window& window) {
+    std::fill(window.data(), window.data() + kWindowSize, uint8_t{0});
+    const int firstRow = std::max(point.y - kWindowHalf, 0);
+    const int lastRow = std::min(point.y + kWindowHalf, image.GetHeight() - 1);
+    const int firstCol = std::max(point.x - kWindowHalf, 0);
+    const int lastCol = std::min(point.x + kWindowHalf, image.GetWidth() - 1);
+    if (lastCol < firstCol) return;
+    // At the border the part inside the image is packed at the window's top left.
+    uint8_t* out = window.data();
+    for (int r = firstRow; r <= lastRow; ++r, out += kWindowSide) {
+        const uint8_t* row = image.GetPtrXY(0, r);
+        std::copy(row + firstCol, row + lastCol + 1, out);
+    }
+}
+
+float CCheatIR::Grade(const Window& a, const Window& b) { return channels::GradeWindows(a.data(), b.data()); }
+
+void CCheatIR::BuildLocalMap(const CPoint& point, const CImage& channel, const Window& reference, GradeMap& map) {
+    const channels::ReferenceStats ref = channels::MakeReferenceStats(reference.data());
+    Window candidate(kWindowSize);
+    const int firstRow = std::max(point.y - kSearch, kCentreMargin);
+    const int lastRow = std::min(point.y + kSearch, channel.GetHeight() - 1 - kCentreMargin);
+    const int firstCol = std::max(point.x - kSearch, kCentreMargin);
+    const int lastCol = std::min(point.x + kSearch, channel.GetWidth() - 1 - kCentreMargin);
+    // Row-major over the clipped square, packed from entry 0; unwritten entries keep their zeros.
+    int k = 0;
+    for (int v = firstRow; v <= lastRow; ++v) {
+        for (int u = firstCol; u <= lastCol; ++u) {
+            BuildBaseWin(CPoint(u, v), channel, candidate);
+            map[k++] = channels::GradeAgainst(candidate.data(), ref);
+        }
+    }
+}
+
+void CCheatIR::MapAccumulate(const GradeMap& map, GradeMap& accumulator) {
+    for (int i = 0; i < kMapSize; ++i) accumulator[i] += map[i];
+}
+
+bool CCheatIR::ChannelMatchAndWarp(CImage& channel, const CImage& reference) {
+    return ChannelMatchAndWarp(channel, reference, nullptr, 0);
+}
+
+bool CCheatIR::ChannelMatchAndWarp(CImage& channel, const CImage& reference, std::vector<SSegmentGrades>* grades,
+                                   int slot) {
+    if (m_segments.empty()) return true;
+    const bool dumps = imagelib::DumpsEnabled();
+    const std::deque<SSegment> segments = m_segments;
+    for (size_t s = 0; s < segments.size(); ++s) {
+        GradeMap accumulator(kMapSize);
+        bool clipped = false;
+        for (const CPoint& point : segments[s].points) {
+            Window window(kWindowSize);
+            GradeMap map(kMapSize);
+            BuildBaseWin(point, reference, window);
+            BuildLocalMap(point, channel, window, map);
+            if (dumps) {
+                DumpMap(map.data(), 1.0f, false, L"\\results\\localMap.bmp");
+                DumpWindow(window.data());
+            }
+            MapAccumulate(map, accumulator);
+            clipped = clipped || SearchClipped(point, channel.GetWidth(), channel.GetHeight());
+        }
+        float largest = 0.0f;
+        for (int i = 0; i < kMapSize; ++i) largest = std::max(largest, accumulator[i]);
+        if (dumps) {
+            if (largest == 0.0f) {
+                CImage picture(kMapSide, kMapSide, 8);
+                picture.Set(255);
+                picture.ExportFile(L"\\results\\acumMap.bmp");
+            } else {
+                DumpMap(accumulator.data(), largest, true, L"\\results\\acumMap.bmp");
+            }
+        }
+        if (grades != nullptr && s < grades->size()) {
+            SSegmentGrades& out = (*grades)[s];
+            out.clipped = out.clipped || clipped;
+            std::copy(accumulator.data(), accumulator.data() + kMapSize, out.accumulated[slot].begin());
+        }
+    }
+    return true;
+}

@@ -1,0 +1,59 @@
+#pragma once
+
+// Helpers shared by the CCheatIR sources and reachable from the tests; not exported.
+
+#include <cstdint>
+#include <deque>
+#include <vector>
+
+#include "channels/CheatIR.h"
+#include "imagelib/CImage.h"
+
+namespace channels {
+
+// The label image's value for "no label" (every bit set).
+constexpr uint16_t kUnlabelled = 0xFFFF;
+// Edge-map values: no edge, falling-edge peak (bright to dark), rising-edge peak.
+constexpr uint8_t kNoEdge = 128;
+constexpr uint8_t kFallingPeak = 0;
+constexpr uint8_t kRisingPeak = 255;
+
+// True when `planes` points at three 8-bit planes of one width and height. `caller` names
+// the operation in the trace line written when they do not.
+bool PlanesUsable(const CImage* planes, const char* caller);
+
+inline int16_t* Row16(CImage& img, int y) { return reinterpret_cast<int16_t*>(img.GetPtrXY(0, y)); }
+inline const int16_t* Row16(const CImage& img, int y) {
+    return reinterpret_cast<const int16_t*>(img.GetPtrXY(0, y));
+}
+inline uint16_t* RowU16(CImage& img, int y) { return reinterpret_cast<uint16_t*>(img.GetPtrXY(0, y)); }
+inline const uint16_t* RowU16(const CImage& img, int y) {
+    return reinterpret_cast<const uint16_t*>(img.GetPtrXY(0, y));
+}
+
+// Label grouping: turns a list of touching label pairs into the final mapping, sorted by
+// `second`, one pair (representative, label) per merged label, the representative being the
+// smallest label of its group.
+// The plain version runs the sort / chain / fan iterations until nothing changes; it is the
+// definition. The fast version reaches the same list through union-find.
+void GroupLabelPairsIterative(std::deque<SLabelPair>& pairs);
+void GroupLabelPairs(std::deque<SLabelPair>& pairs);
+
+// Replaces every labelled value of the label image by its group's representative from the
+// final pair list. The plain version scans the list from its start for every labelled pixel;
+// the fast version looks the label up in a table built from the same list. `labelCount`
+// bounds the labels in use.
+void RelabelByPairScan(CImage& labels, const std::deque<SLabelPair>& pairs);
+void RelabelByLookup(CImage& labels, const std::deque<SLabelPair>& pairs, int labelCount);
+
+// Grading of a 5 x 5 channel window against a reference window whose mean-free values and
+// sum of squares are worked out once per point. Gives the same float as Grade(a, ref).
+struct ReferenceStats {
+    float centred[25];
+    float sumSquares;
+};
+ReferenceStats MakeReferenceStats(const uint8_t* window);
+float GradeAgainst(const uint8_t* window, const ReferenceStats& ref);
+float GradeWindows(const uint8_t* a, const uint8_t* b);
+
+}  // namespace channels
