@@ -7,6 +7,7 @@
 #include <vector>
 
 #include "channels/CheatIR.h"
+#include "frame/SafeArray.h"
 #include "imagelib/CImage.h"
 
 namespace channels {
@@ -45,6 +46,21 @@ void GroupLabelPairs(std::deque<SLabelPair>& pairs);
 // bounds the labels in use.
 void RelabelByPairScan(CImage& labels, const std::deque<SLabelPair>& pairs);
 void RelabelByLookup(CImage& labels, const std::deque<SLabelPair>& pairs, int labelCount);
+
+// Group boxes, index = label: the smallest and largest x and y of the label's pixels (right
+// and bottom inclusive); an all-zero box is unused.
+void BuildGroupBoxes(const CImage& labels, CSafeArray<RECT>& boxes);
+// Each used box in index order swallows every later box it overlaps (IntersectRect: right and
+// bottom exclusive, so boxes that only touch stay apart), sweeping again until a sweep merges
+// nothing; a swallowed box is emptied.
+void MergeOverlappingBoxes(CSafeArray<RECT>& boxes);
+// Appends a segment without points for every box reaching into the middle half of the
+// height, then orders all segments by left, then right.
+void SelectSegments(const CSafeArray<RECT>& boxes, int height, std::deque<SSegment>& segments);
+// Appends the segment's outline points: in every tenth column of the box's middle (an eighth
+// of the width off each side) the first labelled pixel from the top and from the bottom, then
+// in every tenth row of the band the first from the left and from the right.
+void SampleOutline(const CImage& labels, SSegment& segment);
 
 // Grading of a 5 x 5 channel window against a reference window whose mean-free values and
 // sum of squares are worked out once per point. Gives the same float as Grade(a, ref).

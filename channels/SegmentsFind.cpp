@@ -137,18 +137,19 @@ void RelabelByLookup(CImage& labels, const std::deque<SLabelPair>& pairs, int la
     }
 }
 
-}  // namespace channels
-
 namespace {
 
 // A box that no pixel has touched yet: all four fields 0.
 bool IsUnused(const RECT& box) { return box.left == 0 && box.top == 0 && box.right == 0 && box.bottom == 0; }
 
-// Boxes hold the smallest and largest x and y of their label's pixels (right, bottom inclusive).
+bool IsLabelled(const CImage& labels, int x, int y) { return RowU16(labels, y)[x] != kUnlabelled; }
+
+}  // namespace
+
 void BuildGroupBoxes(const CImage& labels, CSafeArray<RECT>& boxes) {
     const int count = static_cast<int>(boxes.count());
     for (int y = 0; y < labels.GetHeight(); ++y) {
-        const uint16_t* row = channels::RowU16(labels, y);
+        const uint16_t* row = RowU16(labels, y);
         for (int x = 0; x < labels.GetWidth(); ++x) {
             if (row[x] >= count) continue;  // unlabelled
             RECT& box = boxes[row[x]];
@@ -164,9 +165,7 @@ void BuildGroupBoxes(const CImage& labels, CSafeArray<RECT>& boxes) {
     }
 }
 
-// Each box in index order swallows every later box it overlaps, sweeping again until a sweep
-// merges nothing. The overlap test treats right and bottom as exclusive, so boxes that only
-// touch stay apart. Unused boxes overlap nothing, so only the used ones are visited.
+// Unused boxes overlap nothing, so only the used ones are visited.
 void MergeOverlappingBoxes(CSafeArray<RECT>& boxes) {
     std::vector<int> used;
     for (uint32_t i = 0; i < boxes.count(); ++i) {
@@ -190,12 +189,7 @@ void MergeOverlappingBoxes(CSafeArray<RECT>& boxes) {
     }
 }
 
-bool IsLabelled(const CImage& labels, int x, int y) { return channels::RowU16(labels, y)[x] != kUnlabelled; }
-
-// In every tenth column of the box's middle (an eighth of the width off each side), the first
-// labelled pixel from the top and from the bottom; in every tenth row of the band, the first
-// from the left and from the right. The band height b bounds the column search, the width
-// the row search.
+// The band height b bounds the column search, the width the row search.
 void SampleOutline(const CImage& labels, SSegment& segment) {
     const int height = labels.GetHeight();
     const RECT& r = segment.rect;
@@ -238,6 +232,26 @@ void SampleOutline(const CImage& labels, SSegment& segment) {
         }
     }
 }
+
+void SelectSegments(const CSafeArray<RECT>& boxes, int height, std::deque<SSegment>& segments) {
+    const double h = height;
+    for (uint32_t i = 0; i < boxes.count(); ++i) {
+        const RECT& box = boxes[i];
+        if (box.top < 0.75 * h && box.bottom > 0.25 * h && box.top <= box.bottom) {
+            SSegment segment;
+            segment.rect = box;
+            segments.push_back(std::move(segment));
+        }
+    }
+    // Left to right; equal boxes keep their index order.
+    std::stable_sort(segments.begin(), segments.end(), [](const SSegment& a, const SSegment& b) {
+        return a.rect.left != b.rect.left ? a.rect.left < b.rect.left : a.rect.right < b.rect.right;
+    });
+}
+
+}  // namespace channels
+
+namespace {
 
 // Labels in spread-out greys, segment boxes in red (palette entry 254).
 void DumpGroups(const CImage& labels, int labelCount, const std::deque<SSegment>& segments) {
@@ -288,24 +302,11 @@ void CCheatIR::SegmentsFind(const CImage& reference) {
     channels::RelabelByLookup(labels, m_labelPairs, labelCount);
 
     CSafeArray<RECT> boxes(static_cast<uint32_t>(labelCount));
-    BuildGroupBoxes(labels, boxes);
-    MergeOverlappingBoxes(boxes);
+    channels::BuildGroupBoxes(labels, boxes);
+    channels::MergeOverlappingBoxes(boxes);
 
-    // Keep the boxes reaching into the middle half of the height.
-    const double h = height;
-    for (uint32_t i = 0; i < boxes.count(); ++i) {
-        const RECT& box = boxes[i];
-        if (box.top < 0.75 * h && box.bottom > 0.25 * h && box.top <= box.bottom) {
-            SSegment segment;
-            segment.rect = box;
-            m_segments.push_back(std::move(segment));
-        }
-    }
-    // Left to right; equal boxes keep their index order.
-    std::stable_sort(m_segments.begin(), m_segments.end(), [](const SSegment& a, const SSegment& b) {
-        return a.rect.left != b.rect.left ? a.rect.left < b.rect.left : a.rect.right < b.rect.right;
-    });
-    for (SSegment& segment : m_segments) SampleOutline(labels, segment);
+    channels::SelectSegments(boxes, height, m_segments);
+    for (SSegment& segment : m_segments) channels::SampleOutline(labels, segment);
 
     if (imagelib::DumpsEnabled()) DumpGroups(labels, labelCount, m_segments);
 }
