@@ -5,6 +5,7 @@
 // trace. Internal to the library (tests reach it through the object library).
 
 #include <cstdint>
+#include <initializer_list>
 #include <vector>
 
 #include "imagelib/CImage.h"
@@ -23,6 +24,15 @@ inline bool SameSize(const CImage& a, const CImage& b) {
 // A non-empty image of the given depth.
 inline bool HasDepth(const CImage& image, int bits) {
     return image.GetBitCount() == bits && !image.IsEmpty() && image.GetWidth() > 0 && image.GetHeight() > 0;
+}
+
+// Non-empty 24-bit images, all of the first one's size.
+inline bool AllSame24(std::initializer_list<const CImage*> images) {
+    const CImage& first = **images.begin();
+    if (!HasDepth(first, 24)) return false;
+    for (const CImage* image : images)
+        if (!SameGeometry(first, *image)) return false;
+    return true;
 }
 
 inline unsigned char ClampByte(int v) { return static_cast<unsigned char>(v < 0 ? 0 : (v > 255 ? 255 : v)); }

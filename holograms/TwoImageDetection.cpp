@@ -62,14 +62,6 @@ bool BuildDifference(const wchar_t* name, CImage& image1, CImage& image2, CImage
     return true;
 }
 
-bool AllSame24(std::initializer_list<const CImage*> images) {
-    const CImage& first = **images.begin();
-    if (!HasDepth(first, 24)) return false;
-    for (const CImage* image : images)
-        if (!SameGeometry(first, *image)) return false;
-    return true;
-}
-
 // Tolerance of the glare test for one channel: lower near saturation, where an excess cannot grow.
 inline int Tolerance(int value) { return value > 240 ? 270 - value : 30; }
 
