@@ -1,0 +1,34 @@
+#pragma once
+
+#include <functional>
+
+#include "imagelib/CImage.h"
+#include "pyramid/Pyramid.h"
+
+// Pieces of the pyramid compositions, exposed to the tests (not exported).
+namespace holo4 {
+
+constexpr int kSaturatedBrightness = 240;  // a Gaussian pixel this bright is saturated
+constexpr int kPeakSpread = 7;             // detail peaks closer than this count as alike
+constexpr int kBrightLimit3 = 250;         // HologramsRemove4Img3 takes candidates below this
+
+// Seven-level Laplacian pyramid of each image with the Gaussian levels it was built from.
+void BuildCandidatePyramids(const CImage* const images[4], CPyramid laplacian[4], CPyramid gaussian[4]);
+
+// Collapses a Laplacian result pyramid and assigns its level 0 to `out`.
+void CollapseInto(CPyramid& result, CImage& out);
+
+// Splits [0, height) into row bands over the worker threads; returns when all are done.
+void ForEachRowBand(int height, const std::function<void(int, int)>& body);
+
+// One pixel of levels 5..0 of HologramsRemove4Img from the candidates' detail pixels and
+// brightness values (candidate order top, bottom, right, left).
+void ComposePixel(const unsigned char* const detail[4], const int bright[4], unsigned char* out);
+
+// Row rules of the two compositions.
+void DarkerOfFirstTwoRow(const unsigned char* const lap[4], unsigned char* out, int width);
+void ComposeRow(const unsigned char* const lap[4], const unsigned char* const gauss[4], unsigned char* out, int width);
+void FlattestUnsaturatedRow(const unsigned char* const lap[4], const unsigned char* const gauss[4],
+                            unsigned char* out, int width);
+
+}  // namespace holo4

@@ -1,0 +1,125 @@
+#include <gtest/gtest.h>
+
+#include "common/TestImages.h"
+#include "holograms/FourImagePyramidInternal.h"
+#include "holograms/test_four_support.h"
+#include "scene/Scene.h"
+
+using namespace four_test;
+
+namespace {
+
+Bgr Composed(const Bgr d[4], const int bright[4]) {
+    unsigned char bytes[4][3];
+    const unsigned char* detail[4];
+    for (int i = 0; i < 4; ++i) {
+        bytes[i][0] = static_cast<unsigned char>(d[i].b);
+        bytes[i][1] = static_cast<unsigned char>(d[i].g);
+        bytes[i][2] = static_cast<unsigned char>(d[i].r);
+        detail[i] = bytes[i];
+    }
+    unsigned char out[3];
+    holo4::ComposePixel(detail, bright, out);
+    return {out[0], out[1], out[2]};
+}
+
+CImage OwnCollapse(const CImage& image) {
+    CPyramid p(7, image);
+    p.MakeLaplacian();
+    p.ReconstructGaussian();
+    return p.GetLevel(0);
+}
+
+}  // namespace
+
+TEST(FourImagePyramid, IdenticalInputsCollapseTheirOwnPyramid) {
+    const CImage img = testing_images::RandomImage(70, 67, 24, 5);
+    const CImage expected = OwnCollapse(img);
+    CHologramsRemove remover;
+    CImage result;
+    remover.HologramsRemove4Img(img, img, img, img, result);
+    EXPECT_TRUE(testing_images::SamePixels(result, expected));
+    remover.HologramsRemove4Img3(img, img, img, img, result);
+    EXPECT_TRUE(testing_images::SamePixels(result, expected));
+}
+
+TEST(FourImagePyramid, SaturationBoundAndCopies) {
+    const Bgr d[4] = {{20, 100, 130}, {64, 96, 128}, {30, 90, 140}, {10, 50, 150}};
+    const int threeSaturated[4] = {240, 250, 245, 239};
+    EXPECT_EQ(Composed(d, threeSaturated), d[3]);
+    const int allSaturated[4] = {250, 245, 241, 245};
+    EXPECT_EQ(Composed(d, allSaturated), d[2]);
+    const int allSaturatedTie[4] = {245, 250, 245, 250};
+    EXPECT_EQ(Composed(d, allSaturatedTie), d[0]);
+    // 239 is not saturated: two unsaturated candidates are synthesised instead of copied.
+    const int twoSaturated[4] = {239, 250, 245, 239};
+    // P = candidate 0 (peak 130 below 150), colour of the most neutral (candidate 0 too).
+    EXPECT_EQ(Composed(d, twoSaturated), (Bgr{20, 100, 130}));
+}
+
+TEST(FourImagePyramid, PeakSpreadSixCopiesSevenSynthesises) {
+    const int bright[4] = {100, 50, 60, 200};  // least bright: candidate 1, second: candidate 2
+    const Bgr close[4] = {{20, 100, 128}, {64, 96, 130}, {30, 90, 134}, {10, 50, 129}};
+    EXPECT_EQ(Composed(close, bright), close[2]);  // largest peak, 134 - 128 = 6
+    // Spread 22: P = candidate 1 (peak 128), colour from the most neutral (candidate 1).
+    const Bgr spread[4] = {{20, 100, 130}, {64, 96, 128}, {30, 90, 140}, {10, 50, 150}};
+    EXPECT_EQ(Composed(spread, bright), (Bgr{64, 96, 128}));
+    // Q's peak 133 exceeds v = 128 > 127 by less than 7: v becomes 133.
+    Bgr nearQ[4] = {{20, 100, 130}, {64, 96, 128}, {30, 90, 133}, {10, 50, 150}};
+    EXPECT_EQ(Composed(nearQ, bright), (Bgr{66, 99, 133}));
+    // No unsaturated detail with all channels non-zero: grey v.
+    const Bgr flat[4] = {{0, 100, 130}, {0, 96, 128}, {0, 90, 140}, {0, 50, 150}};
+    EXPECT_EQ(Composed(flat, bright), (Bgr{128, 128, 128}));
+}
+
+TEST(FourImagePyramid, CoarsestLevelComparesTopAndBottomOnly) {
+    const unsigned char top[6] = {90, 90, 90, 50, 50, 50}, bottom[6] = {80, 80, 80, 50, 50, 50};
+    const unsigned char dark[6] = {0, 0, 0, 0, 0, 0};
+    const unsigned char* lap[4] = {top, bottom, dark, dark};
+    unsigned char out[6];
+    holo4::DarkerOfFirstTwoRow(lap, out, 2);
+    EXPECT_EQ(out[0], 80);  // bottom darker
+    EXPECT_EQ(out[3], 50);  // tie: top
+    EXPECT_EQ(out[0] + out[3], 130);
+}
+
+TEST(FourImagePyramid, Variant3BrightnessBoundAndAllSaturatedTakesTop) {
+    const unsigned char lap0[3] = {100, 100, 100}, lap1[3] = {90, 90, 90}, lap2[3] = {80, 80, 80},
+                        lap3[3] = {70, 70, 70};
+    const unsigned char* lap[4] = {lap0, lap1, lap2, lap3};
+    const unsigned char g249[3] = {249, 0, 0}, g250[3] = {0, 250, 0};
+    const unsigned char* gauss[4] = {g250, g250, g249, g250};
+    unsigned char out[3];
+    holo4::FlattestUnsaturatedRow(lap, gauss, out, 1);
+    EXPECT_EQ(out[0], 80);
+    const unsigned char* allBright[4] = {g250, g250, g250, g250};
+    holo4::FlattestUnsaturatedRow(lap, allBright, out, 1);
+    EXPECT_EQ(out[0], 100);
+}
+
+TEST(FourImagePyramid, MismatchedOrTinyInputsLeaveTheResultAlone) {
+    CHologramsRemove remover;
+    const CImage a = Solid(70, 70, {1, 2, 3}), narrow = Solid(69, 70, {1, 2, 3});
+    CImage grey(70, 70, 8), tiny = Solid(64, 70, {1, 2, 3});
+    CImage result = Solid(3, 3, {9, 9, 9});
+    remover.HologramsRemove4Img(a, a, narrow, a, result);
+    remover.HologramsRemove4Img(a, grey, a, a, result);
+    remover.HologramsRemove4Img3(tiny, tiny, tiny, tiny, result);
+    remover.HologramsRemove4Img3(a, a, a, narrow, result);
+    ASSERT_EQ(result.GetWidth(), 3);
+    EXPECT_EQ(At(result, 1, 1), (Bgr{9, 9, 9}));
+    remover.HologramsRemove4Img(a, a, a, a, result);  // 70 x 70 is enough for seven levels
+    EXPECT_EQ(result.GetWidth(), 70);
+}
+
+TEST(FourImagePyramid, GlareLargelyGoneOnAGeneratedCard) {
+    const scene::Scene s = scene::GenerateScene({310, 438, 3});
+    double worstShot = 1.0;
+    for (const CImage& shot : s.shots) worstShot = std::min(worstShot, scene::GlareShare(s, shot));
+    CHologramsRemove remover;
+    CImage result;
+    remover.HologramsRemove4Img(s.shots[0], s.shots[1], s.shots[2], s.shots[3], result);
+    EXPECT_LT(scene::GlareShare(s, result), worstShot / 4);
+    remover.HologramsRemove4Img3(s.shots[0], s.shots[1], s.shots[2], s.shots[3], result);
+    EXPECT_LT(scene::GlareShare(s, result), worstShot / 4);
+}
