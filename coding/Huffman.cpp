@@ -1,6 +1,6 @@
 #include "coding/Huffman.h"
 
-#include <memory>
+#include <cstddef>
 #include <new>
 #include <vector>
 
@@ -8,52 +8,60 @@
 
 namespace {
 
+// A heap slot: the cell's weight beside the index of the cell in the node pool. Moving
+// these small slots instead of whole cells keeps the heap compact; the order is the same.
+struct HeapSlot {
+    int32_t count;
+    uint32_t cell;
+};
+
 // Binary min-heap of cells ordered by count, kept in an array with the smallest at index 0.
 // Its push and pop moves are fixed exactly, because they decide which of two equal counts
 // comes out first and so which codes the symbols get.
 class CellHeap {
 public:
-    bool Empty() const { return m_cells.empty(); }
+    explicit CellHeap(size_t capacity) { m_slots.reserve(capacity); }
+    bool Empty() const { return m_slots.empty(); }
 
-    void Push(const CHistCell& cell) {
-        m_cells.emplace_back();
-        SiftUp(m_cells.size() - 1, cell);
+    void Push(HeapSlot slot) {
+        m_slots.emplace_back();
+        SiftUp(m_slots.size() - 1, slot);
     }
 
-    CHistCell Pop() {
-        const CHistCell top = m_cells[0];
-        const CHistCell last = m_cells.back();
-        const size_t m = m_cells.size() - 1;  // size after the removal
+    HeapSlot Pop() {
+        const HeapSlot top = m_slots[0];
+        const HeapSlot last = m_slots.back();
+        const size_t m = m_slots.size() - 1;  // size after the removal
         size_t hole = 0;
-        // Walk the hole down along the smaller child; on equal counts the right child moves up.
+        // Walk the hole down along the lighter child; on equal counts the right child moves up.
         while (2 * hole + 2 < m) {
             size_t child = 2 * hole + 2;
-            if (m_cells[child].m_nCount > m_cells[child - 1].m_nCount) --child;
-            m_cells[hole] = m_cells[child];
+            if (m_slots[child].count > m_slots[child - 1].count) --child;
+            m_slots[hole] = m_slots[child];
             hole = child;
         }
         if (2 * hole + 2 == m) {
-            m_cells[hole] = m_cells[m - 1];
+            m_slots[hole] = m_slots[m - 1];
             hole = m - 1;
         }
         SiftUp(hole, last);
-        m_cells.pop_back();
+        m_slots.pop_back();
         return top;
     }
 
 private:
     // Parents move down only when strictly heavier, so equal counts keep their places.
-    void SiftUp(size_t hole, const CHistCell& cell) {
+    void SiftUp(size_t hole, HeapSlot slot) {
         while (hole > 0) {
             const size_t parent = (hole - 1) / 2;
-            if (!(m_cells[parent].m_nCount > cell.m_nCount)) break;
-            m_cells[hole] = m_cells[parent];
+            if (!(m_slots[parent].count > slot.count)) break;
+            m_slots[hole] = m_slots[parent];
             hole = parent;
         }
-        m_cells[hole] = cell;
+        m_slots[hole] = slot;
     }
 
-    std::vector<CHistCell> m_cells;
+    std::vector<HeapSlot> m_slots;
 };
 
 }  // namespace
@@ -72,33 +80,36 @@ bool CHuffman::CodeBuild(const int* histogram, int symbolCount) {
         m_pCodes = new SHuffmanCode[static_cast<size_t>(symbolCount)]();
         m_nSymbols = symbolCount;
 
-        CellHeap heap;
+        // Every cell lives in one pool that never reallocates (at most 2n - 1 cells), so the
+        // children pointers stay valid; the tree is released on return.
+        std::vector<CHistCell> cells;
+        cells.reserve(2 * static_cast<size_t>(symbolCount));
+        CellHeap heap(static_cast<size_t>(symbolCount));
+        auto pushCell = [&](const CHistCell& cell) {
+            cells.push_back(cell);
+            heap.Push(HeapSlot{cell.m_nCount, static_cast<uint32_t>(cells.size() - 1)});
+        };
         for (int i = 0; i < symbolCount; ++i) {
             if (histogram[i] < 1) {
                 m_pCodes[i].symbol = -1;
             } else {
-                heap.Push(CHistCell{i, histogram[i], nullptr, nullptr});
+                pushCell(CHistCell{i, histogram[i], nullptr, nullptr});
                 m_pCodes[i].symbol = i;
             }
         }
 
-        // Every popped cell becomes a tree node of its own; the tree is released on return.
-        std::vector<std::unique_ptr<CHistCell>> nodes;
-        nodes.reserve(2 * static_cast<size_t>(symbolCount));
         CHistCell* root = nullptr;
         while (!heap.Empty()) {
-            nodes.push_back(std::make_unique<CHistCell>(heap.Pop()));
-            CHistCell* lighter = nodes.back().get();
+            CHistCell* lighter = &cells[heap.Pop().cell];
             if (heap.Empty()) {
                 root = lighter;
                 break;
             }
-            nodes.push_back(std::make_unique<CHistCell>(heap.Pop()));
-            CHistCell* heavier = nodes.back().get();
+            CHistCell* heavier = &cells[heap.Pop().cell];
             int32_t weight = 0;
             // A total beyond the 32-bit weight cannot be represented in the tree.
             if (__builtin_add_overflow(lighter->m_nCount, heavier->m_nCount, &weight)) throw OutOfRangeT();
-            heap.Push(CHistCell{0, weight, lighter, heavier});
+            pushCell(CHistCell{0, weight, lighter, heavier});
         }
         if (root != nullptr) TableBuild(root, 1);
     } catch (const OutOfRangeT&) {
