@@ -1,9 +1,314 @@
-// Fast reduce and expand (placeholder: the plain kernels until the vector kernels land).
+// Fast reduce and expand. Both filters are linear with a single truncating shift at the end,
+// so the vertical sum may be formed before the horizontal one without changing a byte: each
+// destination row is made in one sweep, first the weighted sum of the two to five source rows
+// it depends on (a uniform byte-wise kernel, any depth), then the horizontal step on that
+// 16-bit row. Destination rows are split into bands, one band per task, each band with its
+// own slice of the pyramid's work buffer; nothing is allocated per call.
+//
+// Sums stay below 2^16: a reduced value reaches 16 * 16 * 255 = 65280 before the shift by 8,
+// an expanded one 8 * 8 * 255 = 16320 before the shift by 6.
+#undef HWY_TARGET_INCLUDE
+#define HWY_TARGET_INCLUDE "pyramid/PyramidFiltersFast.cpp"
+#include <hwy/foreach_target.h>  // IWYU pragma: keep
+#include <hwy/highway.h>
+
+#include <algorithm>
+#include <cstring>
+
+#include "imagelib/Parallel.h"
 #include "pyramid/FiltersInternal.h"
 
+HWY_BEFORE_NAMESPACE();
+namespace varnoth {
+namespace HWY_NAMESPACE {
+namespace hn = hwy::HWY_NAMESPACE;
+
+using D16 = hn::ScalableTag<uint16_t>;
+
+// sum[e] = w0 * r0[e] + w1 * r1[e] + w2 * r2[e]
+void WeightRows3(const uint8_t* r0, const uint8_t* r1, const uint8_t* r2, uint16_t w0, uint16_t w1, uint16_t w2,
+                 uint16_t* sum, size_t n) {
+    const D16 d;
+    const hn::Rebind<uint8_t, D16> d8;
+    const size_t lanes = hn::Lanes(d);
+    const auto k0 = hn::Set(d, w0), k1 = hn::Set(d, w1), k2 = hn::Set(d, w2);
+    size_t e = 0;
+    for (; e + lanes <= n; e += lanes) {
+        const auto a = hn::PromoteTo(d, hn::LoadU(d8, r0 + e));
+        const auto b = hn::PromoteTo(d, hn::LoadU(d8, r1 + e));
+        const auto c = hn::PromoteTo(d, hn::LoadU(d8, r2 + e));
+        hn::StoreU(hn::Add(hn::Add(hn::Mul(a, k0), hn::Mul(b, k1)), hn::Mul(c, k2)), d, sum + e);
+    }
+    for (; e < n; ++e) sum[e] = static_cast<uint16_t>(w0 * r0[e] + w1 * r1[e] + w2 * r2[e]);
+}
+
+// sum[e] = r0[e] + 4 r1[e] + 6 r2[e] + 4 r3[e] + r4[e]
+void WeightRows5(const uint8_t* const* r, uint16_t* sum, size_t n) {
+    const D16 d;
+    const hn::Rebind<uint8_t, D16> d8;
+    const size_t lanes = hn::Lanes(d);
+    const auto six = hn::Set(d, 6);
+    size_t e = 0;
+    for (; e + lanes <= n; e += lanes) {
+        const auto outer = hn::Add(hn::PromoteTo(d, hn::LoadU(d8, r[0] + e)), hn::PromoteTo(d, hn::LoadU(d8, r[4] + e)));
+        const auto inner = hn::Add(hn::PromoteTo(d, hn::LoadU(d8, r[1] + e)), hn::PromoteTo(d, hn::LoadU(d8, r[3] + e)));
+        const auto centre = hn::PromoteTo(d, hn::LoadU(d8, r[2] + e));
+        hn::StoreU(hn::Add(hn::Add(outer, hn::ShiftLeft<2>(inner)), hn::Mul(centre, six)), d, sum + e);
+    }
+    for (; e < n; ++e)
+        sum[e] = static_cast<uint16_t>(r[0][e] + 4 * r[1][e] + 6 * r[2][e] + 4 * r[3][e] + r[4][e]);
+}
+
+template <class V>
+HWY_INLINE auto NarrowToBytes(V v) {
+    const hn::Rebind<uint8_t, D16> d8;
+    const hn::RebindToSigned<D16> di;
+    return hn::DemoteTo(d8, hn::BitCast(di, v));
+}
+
+// Grey interior outputs 1 .. dw-2 of a vertically summed row v of sw values.
+void ReduceRowGrey(const uint16_t* v, [[maybe_unused]] int sw, int dw, uint8_t* out) {
+    int j = 1;
+#if HWY_TARGET != HWY_SCALAR  // single-lane vectors have no even/odd split
+    const D16 d;
+    const hn::Rebind<uint8_t, D16> d8;
+    const int lanes = static_cast<int>(hn::Lanes(d));
+    const auto six = hn::Set(d, 6);
+    for (; 2 * j + 2 * lanes + 2 <= sw; j += lanes) {
+        // Even and odd source positions around 2j - 2, 2j and 2j + 2.
+        const auto lo0 = hn::LoadU(d, v + 2 * j - 2), hi0 = hn::LoadU(d, v + 2 * j - 2 + lanes);
+        const auto lo1 = hn::LoadU(d, v + 2 * j), hi1 = hn::LoadU(d, v + 2 * j + lanes);
+        const auto lo2 = hn::LoadU(d, v + 2 * j + 2), hi2 = hn::LoadU(d, v + 2 * j + 2 + lanes);
+        const auto outer = hn::Add(hn::ConcatEven(d, hi0, lo0), hn::ConcatEven(d, hi2, lo2));
+        const auto inner = hn::Add(hn::ConcatOdd(d, hi0, lo0), hn::ConcatOdd(d, hi1, lo1));
+        const auto sum = hn::Add(hn::Add(outer, hn::ShiftLeft<2>(inner)), hn::Mul(hn::ConcatEven(d, hi1, lo1), six));
+        hn::StoreU(NarrowToBytes(hn::ShiftRight<8>(sum)), d8, out + j);
+    }
+#endif
+    for (; j <= dw - 2; ++j) {
+        const uint16_t* p = v + 2 * j;
+        out[j] = static_cast<uint8_t>((p[-2] + 4 * p[-1] + 6 * p[0] + 4 * p[1] + p[2]) >> 8);
+    }
+}
+
+// Colour interior outputs: the filter is run at every byte position 6 .. 6(dw-2)+2 of the
+// row into `full`, and every second pixel is then kept.
+void ReduceRowColour(const uint16_t* v, int sw, int dw, uint8_t* full, uint8_t* out) {
+    const D16 d;
+    const hn::Rebind<uint8_t, D16> d8;
+    const int lanes = static_cast<int>(hn::Lanes(d));
+    const int n = 3 * sw, last = 6 * (dw - 2) + 2;
+    const auto six = hn::Set(d, 6);
+    int e = 6;
+    for (; e + lanes + 6 <= n && e <= last; e += lanes) {
+        const auto outer = hn::Add(hn::LoadU(d, v + e - 6), hn::LoadU(d, v + e + 6));
+        const auto inner = hn::Add(hn::LoadU(d, v + e - 3), hn::LoadU(d, v + e + 3));
+        const auto sum = hn::Add(hn::Add(outer, hn::ShiftLeft<2>(inner)), hn::Mul(hn::LoadU(d, v + e), six));
+        hn::StoreU(NarrowToBytes(hn::ShiftRight<8>(sum)), d8, full + e);
+    }
+    for (; e <= last; ++e)
+        full[e] = static_cast<uint8_t>((v[e - 6] + 4 * v[e - 3] + 6 * v[e] + 4 * v[e + 3] + v[e + 6]) >> 8);
+    // Four-byte moves; the fourth byte lands on the next pixel, which is written after it.
+    int j = 1;
+    for (; j < dw - 2; ++j) std::memcpy(out + 3 * j, full + 6 * j, 4);
+    if (j == dw - 2) std::memcpy(out + 3 * j, full + 6 * j, 3);
+}
+
+// Grey interior positions 2 .. 2sw-3: even ones on a source pixel, odd ones between two.
+void ExpandRowGrey(const uint16_t* v, int sw, uint8_t* out) {
+    int i = 1;
+#if HWY_TARGET != HWY_SCALAR  // a single lane cannot hold a byte pair
+    const D16 d;
+    const hn::Repartition<uint8_t, D16> d8;
+    const int lanes = static_cast<int>(hn::Lanes(d));
+    const auto six = hn::Set(d, 6);
+    for (; i + lanes + 1 <= sw; i += lanes) {
+        const auto left = hn::LoadU(d, v + i - 1), centre = hn::LoadU(d, v + i), right = hn::LoadU(d, v + i + 1);
+        const auto on = hn::ShiftRight<6>(hn::Add(hn::Add(left, right), hn::Mul(centre, six)));
+        const auto between = hn::ShiftRight<4>(hn::Add(centre, right));  // 4 (c + r) >> 6
+        hn::StoreU(hn::BitCast(d8, hn::Or(on, hn::ShiftLeft<8>(between))), d8, out + 2 * i);
+    }
+#endif
+    for (; i <= sw - 2; ++i) {
+        out[2 * i] = static_cast<uint8_t>((v[i - 1] + 6 * v[i] + v[i + 1]) >> 6);
+        out[2 * i + 1] = static_cast<uint8_t>((4 * (v[i] + v[i + 1])) >> 6);
+    }
+}
+
+// Colour interior positions: the on-pixel and between-pixel values of every source byte go
+// to `on` and `between`, then pixels are interleaved into the row.
+void ExpandRowColour(const uint16_t* v, int sw, uint8_t* on, uint8_t* between, uint8_t* out) {
+    const D16 d;
+    const hn::Rebind<uint8_t, D16> d8;
+    const int lanes = static_cast<int>(hn::Lanes(d));
+    const int n = 3 * sw, last = 3 * sw - 4;
+    const auto six = hn::Set(d, 6);
+    int e = 3;
+    for (; e + lanes + 3 <= n && e <= last; e += lanes) {
+        const auto left = hn::LoadU(d, v + e - 3), centre = hn::LoadU(d, v + e), right = hn::LoadU(d, v + e + 3);
+        hn::StoreU(NarrowToBytes(hn::ShiftRight<6>(hn::Add(hn::Add(left, right), hn::Mul(centre, six)))), d8, on + e);
+        hn::StoreU(NarrowToBytes(hn::ShiftRight<4>(hn::Add(centre, right))), d8, between + e);
+    }
+    for (; e <= last; ++e) {
+        on[e] = static_cast<uint8_t>((v[e - 3] + 6 * v[e] + v[e + 3]) >> 6);
+        between[e] = static_cast<uint8_t>((4 * (v[e] + v[e + 3])) >> 6);
+    }
+    // Four-byte moves in ascending order; each spare byte is overwritten by the next move,
+    // the last one by the border pixels written afterwards.
+    for (int i = 1; i <= sw - 2; ++i) {
+        std::memcpy(out + 6 * i, on + 3 * i, 4);
+        std::memcpy(out + 6 * i + 3, between + 3 * i, 4);
+    }
+}
+
+}  // namespace HWY_NAMESPACE
+}  // namespace varnoth
+HWY_AFTER_NAMESPACE();
+
+#if HWY_ONCE
 namespace varnoth {
 
-void FastReduce(const CImage& src, CImage& dst, int16_t* work, size_t) { PlainReduce(src, dst, work); }
-void FastExpand(const CImage& src, CImage& dst, int16_t* work, size_t) { PlainExpand(src, dst, work); }
+HWY_EXPORT(WeightRows3);
+HWY_EXPORT(WeightRows5);
+HWY_EXPORT(ReduceRowGrey);
+HWY_EXPORT(ReduceRowColour);
+HWY_EXPORT(ExpandRowGrey);
+HWY_EXPORT(ExpandRowColour);
+
+namespace {
+
+constexpr size_t kSliceAlign = 64;  // elements
+
+size_t AlignUp(size_t n) { return (n + kSliceAlign - 1) / kSliceAlign * kSliceAlign; }
+
+// Splits `rows` destination rows into bands that each get `slice` work elements, and runs
+// them in parallel. False when not even one slice fits.
+template <class BandBody>
+bool RunBands(int rows, size_t slice, int16_t* work, size_t capacity, const BandBody& body) {
+    const size_t fitting = capacity / slice;
+    if (fitting == 0) return false;
+    constexpr int kMinRowsPerBand = 8;
+    const int threads = std::max(1, imagelib::GetThreadLimit());
+    int bands = std::min(std::max(1, rows / kMinRowsPerBand), 8 * threads);
+    bands = static_cast<int>(std::min<size_t>(static_cast<size_t>(bands), fitting));
+    imagelib::ParallelFor(0, bands, [&](int first, int end) {
+        for (int b = first; b < end; ++b) {
+            const int begin = static_cast<int>(static_cast<int64_t>(rows) * b / bands);
+            const int stop = static_cast<int>(static_cast<int64_t>(rows) * (b + 1) / bands);
+            body(begin, stop, work + static_cast<size_t>(b) * slice);
+        }
+    });
+    return true;
+}
+
+}  // namespace
+
+void FastReduce(const CImage& src, CImage& dst, int16_t* work, size_t capacity) {
+    const int ch = src.GetBitCount() / 8;
+    const int sw = src.GetWidth(), sh = src.GetHeight(), dw = dst.GetWidth(), dh = dst.GetHeight();
+    const size_t n = static_cast<size_t>(sw) * ch, sspan = src.GetSpan(), dspan = dst.GetSpan();
+    const uint8_t* srcBits = src.GetBits();
+    uint8_t* dstBits = dst.GetBits();
+    // Vertical sums, then (colour) the byte row of the filter at every position.
+    const size_t slice = AlignUp(n) + AlignUp(n / 2 + 8);
+
+    auto reduceRows = [&](int begin, int end, int16_t* scratch) {
+        uint16_t* sum = reinterpret_cast<uint16_t*>(scratch);
+        uint8_t* full = reinterpret_cast<uint8_t*>(scratch + AlignUp(n));
+        auto row = [&](int m) { return srcBits + static_cast<size_t>(m) * sspan; };
+        for (int r = begin; r < end; ++r) {
+            // Rows in memory order; the first and last destination rows mirror about the
+            // first and last source rows.
+            if (r == 0) {
+                HWY_DYNAMIC_DISPATCH(WeightRows3)(row(0), row(1), row(2), 6, 8, 2, sum, n);
+            } else if (r == dh - 1) {
+                HWY_DYNAMIC_DISPATCH(WeightRows3)(row(sh - 1), row(sh - 2), row(sh - 3), 6, 8, 2, sum, n);
+            } else {
+                const uint8_t* rows[5] = {row(2 * r - 2), row(2 * r - 1), row(2 * r), row(2 * r + 1), row(2 * r + 2)};
+                HWY_DYNAMIC_DISPATCH(WeightRows5)(rows, sum, n);
+            }
+            uint8_t* out = dstBits + static_cast<size_t>(r) * dspan;
+            if (ch == 1) {
+                HWY_DYNAMIC_DISPATCH(ReduceRowGrey)(sum, sw, dw, out);
+            } else {
+                HWY_DYNAMIC_DISPATCH(ReduceRowColour)(sum, sw, dw, full, out);
+            }
+            for (int c = 0; c < ch; ++c) {
+                auto v = [&](int i) { return static_cast<int>(sum[i * ch + c]); };
+                out[c] = static_cast<uint8_t>((6 * v(0) + 8 * v(1) + 2 * v(2)) >> 8);
+                out[(dw - 1) * ch + c] = static_cast<uint8_t>((6 * v(sw - 1) + 8 * v(sw - 2) + 2 * v(sw - 3)) >> 8);
+            }
+        }
+    };
+    if (!RunBands(dh, slice, work, capacity, reduceRows)) PlainReduce(src, dst, work);
+}
+
+namespace {
+
+// The horizontal expand value (weight 8) at destination position x for the border positions,
+// as the last of the overlapping writes leaves it: interior, then dw-1, 1, dw-2, 0.
+int ExpandEdge(const uint16_t* sum, int ch, int c, int sw, int dw, int x) {
+    auto v = [&](int i) { return static_cast<int>(sum[i * ch + c]); };
+    if (x == dw - 1) return 4 * (v(sw - 1) + v(sw - 2));
+    if (x == 1) return 4 * (v(0) + v(1));
+    if (x == dw - 2) return 2 * (3 * v(sw - 1) + v(sw - 2));
+    return 2 * (3 * v(0) + v(1));
+}
+
+}  // namespace
+
+void FastExpand(const CImage& src, CImage& dst, int16_t* work, size_t capacity) {
+    const int ch = src.GetBitCount() / 8;
+    const int sw = src.GetWidth(), sh = src.GetHeight(), dw = dst.GetWidth(), dh = dst.GetHeight();
+    const size_t n = static_cast<size_t>(sw) * ch;
+    const int dspan = dst.GetSpan();
+    // Vertical sums, then (colour) the on-pixel and between-pixel byte rows.
+    const size_t slice = AlignUp(n) + 2 * AlignUp(n / 2 + 8);
+
+    auto expandRows = [&](int begin, int end, int16_t* scratch) {
+        uint16_t* sum = reinterpret_cast<uint16_t*>(scratch);
+        uint8_t* on = reinterpret_cast<uint8_t*>(scratch + AlignUp(n));
+        uint8_t* between = reinterpret_cast<uint8_t*>(scratch + AlignUp(n) + AlignUp(n / 2 + 8));
+        auto row = [&](int y) { return src.GetPtrXY(0, y); };
+        for (int t = begin; t < end; ++t) {
+            // Rows through GetPtrXY; the border rows are the last writes of the definition,
+            // in the order 0, 1, dh-2, dh-1, so the later ones win.
+            const uint8_t *r0, *r1, *r2;
+            uint16_t w0, w1, w2 = 0;
+            if (t == dh - 1) {
+                r0 = row(sh - 1), r1 = r2 = row(sh - 2), w0 = 6, w1 = 2;
+            } else if (t == dh - 2) {
+                r0 = row(sh - 2), r1 = r2 = row(sh - 1), w0 = 4, w1 = 4;
+            } else if (t == 1) {
+                r0 = row(0), r1 = r2 = row(1), w0 = 4, w1 = 4;
+            } else if (t == 0) {
+                r0 = row(0), r1 = r2 = row(1), w0 = 6, w1 = 2;
+            } else if (t % 2 == 0) {
+                const int k = (t - 2) / 2;
+                r0 = row(k), r1 = row(k + 1), r2 = row(k + 2), w0 = 1, w1 = 6, w2 = 1;
+            } else {
+                const int k = (t - 3) / 2;
+                r0 = row(k + 1), r1 = r2 = row(k + 2), w0 = 4, w1 = 4;
+            }
+            HWY_DYNAMIC_DISPATCH(WeightRows3)(r0, r1, r2, w0, w1, w2, sum, n);
+
+            uint8_t* out = dst.GetPtrXY(0, t);
+            if (ch == 1) {
+                HWY_DYNAMIC_DISPATCH(ExpandRowGrey)(sum, sw, out);
+            } else {
+                HWY_DYNAMIC_DISPATCH(ExpandRowColour)(sum, sw, on, between, out);
+            }
+            for (int x : {0, 1}) {
+                for (int c = 0; c < ch; ++c) out[x * ch + c] = static_cast<uint8_t>(ExpandEdge(sum, ch, c, sw, dw, x) >> 6);
+            }
+            for (int x = std::max(2, 2 * sw - 2); x < dw; ++x) {
+                for (int c = 0; c < ch; ++c) out[x * ch + c] = static_cast<uint8_t>(ExpandEdge(sum, ch, c, sw, dw, x) >> 6);
+            }
+            std::memset(out + static_cast<size_t>(dw) * ch, 0, dspan - static_cast<size_t>(dw) * ch);
+        }
+    };
+    if (!RunBands(dh, slice, work, capacity, expandRows)) PlainExpand(src, dst, work);
+}
 
 }  // namespace varnoth
+#endif  // HWY_ONCE

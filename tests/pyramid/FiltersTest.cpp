@@ -2,6 +2,8 @@
 
 #include <vector>
 
+#include <hwy/targets.h>
+
 #include "imagelib/Parallel.h"
 #include "pyramid/FiltersInternal.h"
 #include "pyramid/Pyramid.h"
@@ -142,39 +144,54 @@ TEST(PyramidFilters, RefuseWhatTheyCannotFilter) {
     tiny.Expand(self, self);  // 4 -> 4 is not a level step, and a filter never works in place
 }
 
-// The fast filters against the plain definition, byte for byte over the whole buffers.
-TEST(PyramidFilters, FastMatchesPlain) {
+namespace {
+
+void ExpectFastMatchesPlain(uint32_t seed) {
     const int widths[] = {3, 4, 5, 6, 7, 8, 9, 15, 16, 17, 31, 32, 33, 63, 64, 65, 66, 100, 129, 255, 256, 300};
     const int heights[] = {3, 4, 5, 8, 11, 37, 64, 101};
     std::vector<int16_t> work(512 * 512 * 3);
-    uint32_t seed = 7;
-    for (int threads : {1, 2}) {
-        imagelib::SetThreadLimit(threads);
-        for (int bits : {8, 24})
-            for (int w : widths)
-                for (int h : heights) {
-                    const int dw = CPyramid::NextLevelSize(w), dh = CPyramid::NextLevelSize(h);
-                    const CImage big = RandomImage(w, h, bits, ++seed), small = RandomImage(dw, dh, bits, ++seed);
-                    CImage plain = RandomImage(dw, dh, bits, ++seed), fast = plain;
-                    varnoth::PlainReduce(big, plain, work.data());
-                    varnoth::FastReduce(big, fast, work.data(), work.size());
-                    ASSERT_TRUE(SameBytes(plain, fast)) << "reduce " << w << "x" << h << " bits " << bits;
+    for (int bits : {8, 24})
+        for (int w : widths)
+            for (int h : heights) {
+                const int dw = CPyramid::NextLevelSize(w), dh = CPyramid::NextLevelSize(h);
+                const CImage big = RandomImage(w, h, bits, ++seed), small = RandomImage(dw, dh, bits, ++seed);
+                CImage plain = RandomImage(dw, dh, bits, ++seed), fast = plain;
+                varnoth::PlainReduce(big, plain, work.data());
+                varnoth::FastReduce(big, fast, work.data(), work.size());
+                ASSERT_TRUE(SameBytes(plain, fast)) << "reduce " << w << "x" << h << " bits " << bits;
 
-                    plain = RandomImage(w, h, bits, ++seed);
-                    fast = plain;
-                    varnoth::PlainExpand(small, plain, work.data());
-                    varnoth::FastExpand(small, fast, work.data(), work.size());
-                    ASSERT_TRUE(SameBytes(plain, fast)) << "expand " << dw << "x" << dh << " bits " << bits;
-                }
-        // A 2-pixel source expands into 2, 3 or 4 pixels.
-        for (int d : {2, 3, 4}) {
-            const CImage small = RandomImage(2, 2, 24, ++seed);
-            CImage plain = RandomImage(d, d, 24, ++seed), fast = plain;
-            varnoth::PlainExpand(small, plain, work.data());
-            varnoth::FastExpand(small, fast, work.data(), work.size());
-            ASSERT_TRUE(SameBytes(plain, fast)) << "expand 2 -> " << d;
-        }
+                plain = RandomImage(w, h, bits, ++seed);
+                fast = plain;
+                varnoth::PlainExpand(small, plain, work.data());
+                varnoth::FastExpand(small, fast, work.data(), work.size());
+                ASSERT_TRUE(SameBytes(plain, fast)) << "expand " << dw << "x" << dh << " bits " << bits;
+            }
+    // A 2-pixel source expands into 2, 3 or 4 pixels.
+    for (int d : {2, 3, 4}) {
+        const CImage small = RandomImage(2, 2, 24, ++seed);
+        CImage plain = RandomImage(d, d, 24, ++seed), fast = plain;
+        varnoth::PlainExpand(small, plain, work.data());
+        varnoth::FastExpand(small, fast, work.data(), work.size());
+        ASSERT_TRUE(SameBytes(plain, fast)) << "expand 2 -> " << d;
     }
+}
+
+}  // namespace
+
+// The fast filters against the plain definition, byte for byte over the whole buffers (random
+// row padding included), on every vector target this machine runs and at 1 and 2 threads.
+TEST(PyramidFilters, FastMatchesPlain) {
+    imagelib::SetThreadLimit(1);
+    for (int64_t target : hwy::SupportedAndGeneratedTargets()) {
+        hwy::SetSupportedTargetsForTest(target);
+        hwy::GetChosenTarget().Update(hwy::SupportedTargets());
+        SCOPED_TRACE(hwy::TargetName(target));
+        ExpectFastMatchesPlain(static_cast<uint32_t>(target));
+    }
+    hwy::SetSupportedTargetsForTest(0);
+    hwy::GetChosenTarget().Update(hwy::SupportedTargets());
+    imagelib::SetThreadLimit(2);
+    ExpectFastMatchesPlain(99);
     imagelib::SetThreadLimit(0);
 }
 
