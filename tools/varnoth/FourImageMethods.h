@@ -1,0 +1,41 @@
+#pragma once
+
+#include <string>
+#include <vector>
+
+#include "holograms/HologramsRemove.h"
+#include "imagelib/CImage.h"
+
+// The four-image glare removal methods the tool and the demo offer, by name.
+struct FourImageMethod {
+    const char* name;
+    const char* description;
+    // shots in the order top, bottom, left, right
+    void (*run)(CHologramsRemove& remover, const CImage* const shots[4], CImage& result);
+};
+
+inline const std::vector<FourImageMethod>& FourImageMethods() {
+    static const std::vector<FourImageMethod> methods = {
+        {"pyramid", "choose or synthesise each detail pixel by brightness, saturation and detail strength",
+         [](CHologramsRemove& r, const CImage* const s[4], CImage& out) {
+             r.HologramsRemove4Img(*s[0], *s[1], *s[2], *s[3], out);
+         }},
+        {"pyramid3", "take the weakest detail among the candidates below brightness 250",
+         [](CHologramsRemove& r, const CImage* const s[4], CImage& out) {
+             r.HologramsRemove4Img3(*s[0], *s[1], *s[2], *s[3], out);
+         }},
+    };
+    return methods;
+}
+
+inline const FourImageMethod* FindFourImageMethod(const std::string& name) {
+    for (const FourImageMethod& m : FourImageMethods())
+        if (name == m.name) return &m;
+    return nullptr;
+}
+
+inline std::string FourImageMethodNames() {
+    std::string names;
+    for (const FourImageMethod& m : FourImageMethods()) names += (names.empty() ? "" : "|") + std::string(m.name);
+    return names;
+}
