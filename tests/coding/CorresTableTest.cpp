@@ -1,10 +1,12 @@
 #include <gtest/gtest.h>
 
+#include <cstdint>
 #include <cstring>
 #include <random>
 #include <vector>
 
 #include "coding/CorresTable.h"
+#include "hwy/targets.h"
 #include "coding/CorresTableInternal.h"
 
 namespace {
@@ -182,15 +184,20 @@ TEST(CorresTable, FastScoresMatchPlainScores) {
         {12, 12, 12, 12, 0, {-3, 5}, {0, 11, 0, 11}, 2},        // p's window outside a
         {300, 8, 300, 8, 230, {150, 4}, {60, 240, 2, 5}, 91},   // beyond the fast width
     };
-    unsigned seed = 11;
-    for (const Case& c : cases) {
-        CImage a = Noise(c.wa, c.ha, seed++, c.lo), b = Noise(c.wb, c.hb, seed++, c.lo);
-        const size_t count = static_cast<size_t>(c.area.Rows()) * c.area.Columns();
-        std::vector<float> plain(count, -1.0f), fast(count, -2.0f);
-        varnoth::coding::ScoreSearchAreaPlain(a, b, c.p, c.area, c.n, plain.data());
-        varnoth::coding::ScoreSearchArea(a, b, c.p, c.area, c.n, fast.data());
-        EXPECT_EQ(0, std::memcmp(plain.data(), fast.data(), count * sizeof(float))) << "window " << c.n;
+    for (int64_t target : hwy::SupportedAndGeneratedTargets()) {
+        hwy::SetSupportedTargetsForTest(target);
+        unsigned seed = 11;
+        for (const Case& c : cases) {
+            CImage a = Noise(c.wa, c.ha, seed++, c.lo), b = Noise(c.wb, c.hb, seed++, c.lo);
+            const size_t count = static_cast<size_t>(c.area.Rows()) * c.area.Columns();
+            std::vector<float> plain(count, -1.0f), fast(count, -2.0f);
+            varnoth::coding::ScoreSearchAreaPlain(a, b, c.p, c.area, c.n, plain.data());
+            varnoth::coding::ScoreSearchArea(a, b, c.p, c.area, c.n, fast.data());
+            EXPECT_EQ(0, std::memcmp(plain.data(), fast.data(), count * sizeof(float)))
+                << hwy::TargetName(target) << ", window " << c.n;
+        }
     }
+    hwy::SetSupportedTargetsForTest(0);
 }
 
 }  // namespace
