@@ -29,4 +29,11 @@ void PlainExpand(const CImage& src, CImage& dst, int16_t* work);
 void FastReduce(const CImage& src, CImage& dst, int16_t* work, size_t capacity);
 void FastExpand(const CImage& src, CImage& dst, int16_t* work, size_t capacity);
 
+// target = target - expand(coarse) + 128 (add false) or target + expand(coarse) - 127 (add
+// true), clamped, over every byte of each row: Expand into an image of target's geometry
+// followed by ImageSubtract / ImageAdd, without the intermediate image. The caller checks
+// ExpandGeometryOk(coarse, target) and FilterWorkNeed. False (target untouched) when the work
+// buffer has no room for a band of rows.
+bool FastExpandCombine(const CImage& coarse, CImage& target, bool add, int16_t* work, size_t capacity);
+
 }  // namespace varnoth

@@ -1,11 +1,31 @@
 #include "pyramid/Pyramid.h"
 
-#include <functional>
+#include <cstring>
 #include <memory>
 
 #include "frame/ImageArithmetic.h"
 #include "imagelib/Trace.h"
 #include "pyramid/FiltersInternal.h"
+
+namespace {
+
+// dst = src; when the geometry is already right the pixels are copied into place, which
+// spares a scan-sized reallocation for every refill of a long-lived pyramid.
+void CopyImage(CImage& dst, const CImage& src) {
+    if (&dst == &src) return;
+    const bool sameGeometry = !dst.IsEmpty() && dst.GetWidth() == src.GetWidth() &&
+                              dst.GetHeight() == src.GetHeight() && dst.GetBitCount() == src.GetBitCount();
+    if (!sameGeometry) {
+        dst = src;
+        return;
+    }
+    std::memcpy(dst.GetBits(), src.GetBits(), src.GetSize());
+    for (int i = 0; i < 256; ++i) {
+        if (dst.GetPaletteColor(i) != src.GetPaletteColor(i)) dst.SetPaletteColor(i, src.GetPaletteColor(i));
+    }
+}
+
+}  // namespace
 
 CPyramid::CPyramid() = default;
 
@@ -36,7 +56,7 @@ CPyramid& CPyramid::operator=(const CPyramid& source) {
     if (source.m_pLevels != nullptr && source.m_nLevels > 0) {
         Init(source.m_pLevels[0], source.m_nLevels);
         if (m_nLevels == source.m_nLevels) {
-            for (int k = 1; k < m_nLevels; ++k) m_pLevels[k] = source.m_pLevels[k];
+            for (int k = 1; k < m_nLevels; ++k) CopyImage(m_pLevels[k], source.m_pLevels[k]);
         }
     } else {
         ReleaseLevels();
@@ -95,7 +115,7 @@ void CPyramid::Init(const CImage& image, int levels) {
         return;
     }
     Init(source->GetWidth(), source->GetHeight(), channels, levels);
-    m_pLevels[0] = *source;
+    CopyImage(m_pLevels[0], *source);
     m_bHasImage = true;
 }
 
@@ -104,7 +124,7 @@ bool CPyramid::SetImage(const CImage& image) {
     // A level 0 of another size would no longer match the coarser levels and the work buffer.
     if (image.GetWidth() != m_pLevels[0].GetWidth() || image.GetHeight() != m_pLevels[0].GetHeight()) return false;
     m_eType = PyrNone;
-    m_pLevels[0] = image;
+    CopyImage(m_pLevels[0], image);
     m_bHasImage = true;
     m_nChannels = image.GetBitCount() / 8;
     return true;
@@ -122,7 +142,7 @@ void CPyramid::MakeLaplacian(CPyramid* gaussianCopy) {
     if (gaussianCopy != nullptr && gaussianCopy != this) {
         gaussianCopy->Init(m_pLevels[0], m_nLevels);
         if (gaussianCopy->m_nLevels == m_nLevels) {
-            for (int k = 1; k < m_nLevels; ++k) gaussianCopy->m_pLevels[k] = m_pLevels[k];
+            for (int k = 1; k < m_nLevels; ++k) CopyImage(gaussianCopy->m_pLevels[k], m_pLevels[k]);
         }
     }
     // Ascending: level k+1 is still Gaussian when level k is formed.
@@ -141,8 +161,14 @@ void CPyramid::ReconstructGaussian() {
 
 void CPyramid::ExpandAndCombine(int level, CImage& scratch, bool add) {
     CImage& target = m_pLevels[level];
+    const CImage& coarse = m_pLevels[level + 1];
+    // Row by row without the intermediate image when the levels fit the filter.
+    if (varnoth::ExpandGeometryOk(coarse, target) && varnoth::FilterWorkNeed(coarse, target) <= m_nWorkSize &&
+        varnoth::FastExpandCombine(coarse, target, add, m_pWork, m_nWorkSize)) {
+        return;
+    }
     scratch.Reallocate(target.GetWidth(), target.GetHeight(), target.GetBitCount(), 0);
-    Expand(m_pLevels[level + 1], scratch);
+    Expand(coarse, scratch);
     if (add) {
         ImageAdd(target, scratch, target, true);
     } else {

@@ -15,6 +15,7 @@
 #include <algorithm>
 #include <cstring>
 
+#include "frame/ArithmeticInternal.h"
 #include "imagelib/Parallel.h"
 #include "pyramid/FiltersInternal.h"
 
@@ -255,59 +256,87 @@ int ExpandEdge(const uint16_t* sum, int ch, int c, int sw, int dw, int x) {
     return 2 * (3 * v(0) + v(1));
 }
 
+// Scratch of one band of expanded rows: vertical sums, then (colour) the on-pixel and
+// between-pixel byte rows, then (when combining) the expanded row itself.
+struct ExpandScratch {
+    ExpandScratch(size_t n, size_t rowBytes)
+        : sumSize(AlignUp(n)), bytesSize(AlignUp(n / 2 + 8)), rowSize(AlignUp(rowBytes / 2 + 8)) {}
+    size_t Slice(bool withRow) const { return sumSize + 2 * bytesSize + (withRow ? rowSize : 0); }
+    uint16_t* Sum(int16_t* s) const { return reinterpret_cast<uint16_t*>(s); }
+    uint8_t* On(int16_t* s) const { return reinterpret_cast<uint8_t*>(s + sumSize); }
+    uint8_t* Between(int16_t* s) const { return reinterpret_cast<uint8_t*>(s + sumSize + bytesSize); }
+    uint8_t* Row(int16_t* s) const { return reinterpret_cast<uint8_t*>(s + sumSize + 2 * bytesSize); }
+    size_t sumSize, bytesSize, rowSize;
+};
+
+// Destination row t (GetPtrXY order) of the expand of src into a dw x dh image, written to
+// `out`: dw * ch bytes, then 0 up to `span`.
+void ExpandRow(const CImage& src, int dw, int dh, int t, const ExpandScratch& layout, int16_t* scratch,
+               uint8_t* out, size_t span) {
+    const int ch = src.GetBitCount() / 8;
+    const int sw = src.GetWidth(), sh = src.GetHeight();
+    const size_t n = static_cast<size_t>(sw) * ch;
+    uint16_t* sum = layout.Sum(scratch);
+    auto row = [&](int y) { return src.GetPtrXY(0, y); };
+    // The border rows are the last writes of the definition, in the order 0, 1, dh-2, dh-1,
+    // so the later ones win.
+    const uint8_t *r0, *r1, *r2;
+    uint16_t w0, w1, w2 = 0;
+    if (t == dh - 1) {
+        r0 = row(sh - 1), r1 = r2 = row(sh - 2), w0 = 6, w1 = 2;
+    } else if (t == dh - 2) {
+        r0 = row(sh - 2), r1 = r2 = row(sh - 1), w0 = 4, w1 = 4;
+    } else if (t == 1) {
+        r0 = row(0), r1 = r2 = row(1), w0 = 4, w1 = 4;
+    } else if (t == 0) {
+        r0 = row(0), r1 = r2 = row(1), w0 = 6, w1 = 2;
+    } else if (t % 2 == 0) {
+        const int k = (t - 2) / 2;
+        r0 = row(k), r1 = row(k + 1), r2 = row(k + 2), w0 = 1, w1 = 6, w2 = 1;
+    } else {
+        const int k = (t - 3) / 2;
+        r0 = row(k + 1), r1 = r2 = row(k + 2), w0 = 4, w1 = 4;
+    }
+    HWY_DYNAMIC_DISPATCH(WeightRows3)(r0, r1, r2, w0, w1, w2, sum, n);
+
+    if (ch == 1) {
+        HWY_DYNAMIC_DISPATCH(ExpandRowGrey)(sum, sw, out);
+    } else {
+        HWY_DYNAMIC_DISPATCH(ExpandRowColour)(sum, sw, layout.On(scratch), layout.Between(scratch), out);
+    }
+    for (int x : {0, 1}) {
+        for (int c = 0; c < ch; ++c) out[x * ch + c] = static_cast<uint8_t>(ExpandEdge(sum, ch, c, sw, dw, x) >> 6);
+    }
+    for (int x = std::max(2, 2 * sw - 2); x < dw; ++x) {
+        for (int c = 0; c < ch; ++c) out[x * ch + c] = static_cast<uint8_t>(ExpandEdge(sum, ch, c, sw, dw, x) >> 6);
+    }
+    std::memset(out + static_cast<size_t>(dw) * ch, 0, span - static_cast<size_t>(dw) * ch);
+}
+
 }  // namespace
 
 void FastExpand(const CImage& src, CImage& dst, int16_t* work, size_t capacity) {
-    const int ch = src.GetBitCount() / 8;
-    const int sw = src.GetWidth(), sh = src.GetHeight(), dw = dst.GetWidth(), dh = dst.GetHeight();
-    const size_t n = static_cast<size_t>(sw) * ch;
-    const int dspan = dst.GetSpan();
-    // Vertical sums, then (colour) the on-pixel and between-pixel byte rows.
-    const size_t slice = AlignUp(n) + 2 * AlignUp(n / 2 + 8);
-
+    const int dw = dst.GetWidth(), dh = dst.GetHeight();
+    const ExpandScratch layout(static_cast<size_t>(src.GetWidth()) * (src.GetBitCount() / 8), dst.GetSpan());
     auto expandRows = [&](int begin, int end, int16_t* scratch) {
-        uint16_t* sum = reinterpret_cast<uint16_t*>(scratch);
-        uint8_t* on = reinterpret_cast<uint8_t*>(scratch + AlignUp(n));
-        uint8_t* between = reinterpret_cast<uint8_t*>(scratch + AlignUp(n) + AlignUp(n / 2 + 8));
-        auto row = [&](int y) { return src.GetPtrXY(0, y); };
-        for (int t = begin; t < end; ++t) {
-            // Rows through GetPtrXY; the border rows are the last writes of the definition,
-            // in the order 0, 1, dh-2, dh-1, so the later ones win.
-            const uint8_t *r0, *r1, *r2;
-            uint16_t w0, w1, w2 = 0;
-            if (t == dh - 1) {
-                r0 = row(sh - 1), r1 = r2 = row(sh - 2), w0 = 6, w1 = 2;
-            } else if (t == dh - 2) {
-                r0 = row(sh - 2), r1 = r2 = row(sh - 1), w0 = 4, w1 = 4;
-            } else if (t == 1) {
-                r0 = row(0), r1 = r2 = row(1), w0 = 4, w1 = 4;
-            } else if (t == 0) {
-                r0 = row(0), r1 = r2 = row(1), w0 = 6, w1 = 2;
-            } else if (t % 2 == 0) {
-                const int k = (t - 2) / 2;
-                r0 = row(k), r1 = row(k + 1), r2 = row(k + 2), w0 = 1, w1 = 6, w2 = 1;
-            } else {
-                const int k = (t - 3) / 2;
-                r0 = row(k + 1), r1 = r2 = row(k + 2), w0 = 4, w1 = 4;
-            }
-            HWY_DYNAMIC_DISPATCH(WeightRows3)(r0, r1, r2, w0, w1, w2, sum, n);
+        for (int t = begin; t < end; ++t) ExpandRow(src, dw, dh, t, layout, scratch, dst.GetPtrXY(0, t), dst.GetSpan());
+    };
+    if (!RunBands(dh, layout.Slice(false), work, capacity, expandRows)) PlainExpand(src, dst, work);
+}
 
-            uint8_t* out = dst.GetPtrXY(0, t);
-            if (ch == 1) {
-                HWY_DYNAMIC_DISPATCH(ExpandRowGrey)(sum, sw, out);
-            } else {
-                HWY_DYNAMIC_DISPATCH(ExpandRowColour)(sum, sw, on, between, out);
-            }
-            for (int x : {0, 1}) {
-                for (int c = 0; c < ch; ++c) out[x * ch + c] = static_cast<uint8_t>(ExpandEdge(sum, ch, c, sw, dw, x) >> 6);
-            }
-            for (int x = std::max(2, 2 * sw - 2); x < dw; ++x) {
-                for (int c = 0; c < ch; ++c) out[x * ch + c] = static_cast<uint8_t>(ExpandEdge(sum, ch, c, sw, dw, x) >> 6);
-            }
-            std::memset(out + static_cast<size_t>(dw) * ch, 0, dspan - static_cast<size_t>(dw) * ch);
+bool FastExpandCombine(const CImage& coarse, CImage& target, bool add, int16_t* work, size_t capacity) {
+    const int dw = target.GetWidth(), dh = target.GetHeight();
+    const size_t span = target.GetSpan();
+    const ExpandScratch layout(static_cast<size_t>(coarse.GetWidth()) * (coarse.GetBitCount() / 8), span);
+    auto combineRows = [&](int begin, int end, int16_t* scratch) {
+        uint8_t* expanded = layout.Row(scratch);
+        for (int t = begin; t < end; ++t) {
+            ExpandRow(coarse, dw, dh, t, layout, scratch, expanded, span);
+            uint8_t* row = target.GetPtrXY(0, t);
+            add ? FastAddBytes(row, expanded, row, span) : FastSubtractBytes(row, expanded, row, span);
         }
     };
-    if (!RunBands(dh, slice, work, capacity, expandRows)) PlainExpand(src, dst, work);
+    return RunBands(dh, layout.Slice(true), work, capacity, combineRows);
 }
 
 }  // namespace varnoth

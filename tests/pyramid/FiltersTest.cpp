@@ -4,6 +4,7 @@
 
 #include <hwy/targets.h>
 
+#include "frame/ArithmeticInternal.h"
 #include "imagelib/Parallel.h"
 #include "pyramid/FiltersInternal.h"
 #include "pyramid/Pyramid.h"
@@ -165,6 +166,17 @@ void ExpectFastMatchesPlain(uint32_t seed) {
                 varnoth::PlainExpand(small, plain, work.data());
                 varnoth::FastExpand(small, fast, work.data(), work.size());
                 ASSERT_TRUE(SameBytes(plain, fast)) << "expand " << dw << "x" << dh << " bits " << bits;
+
+                // Expand fused with the detail arithmetic of the Laplacian build and collapse.
+                for (bool add : {false, true}) {
+                    CImage target = RandomImage(w, h, bits, ++seed), expanded(w, h, bits);
+                    CImage combined = target;
+                    varnoth::PlainExpand(small, expanded, work.data());
+                    auto bytes = add ? varnoth::PlainAddBytes : varnoth::PlainSubtractBytes;
+                    bytes(target.GetBits(), expanded.GetBits(), target.GetBits(), target.GetSize());
+                    ASSERT_TRUE(varnoth::FastExpandCombine(small, combined, add, work.data(), work.size()));
+                    ASSERT_TRUE(SameBytes(target, combined)) << "combine " << w << "x" << h << " bits " << bits;
+                }
             }
     // A 2-pixel source expands into 2, 3 or 4 pixels.
     for (int d : {2, 3, 4}) {
