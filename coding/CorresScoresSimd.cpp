@@ -23,13 +23,17 @@ HWY_BEFORE_NAMESPACE();
 namespace varnoth::coding::HWY_NAMESPACE {
 namespace hn = hwy::HWY_NAMESPACE;
 
-size_t Int16Lanes() { return hn::Lanes(hn::ScalableTag<int16_t>()); }
+// At most 16 lanes: the usual 15-pixel window fills one such vector per row, while wider
+// vectors would mostly multiply padding.
+using WindowTag = hn::CappedTag<int16_t, 16>;
+
+size_t Int16Lanes() { return hn::Lanes(WindowTag()); }
 
 // Dot product of the padded window (rows of `paddedWidth`, a multiple of the lane count)
 // with the area block whose top-left is `block`. Fits in int32 for windows up to 181 wide.
 HWY_INLINE int32_t WindowDot(const int16_t* HWY_RESTRICT window, size_t paddedWidth, int height,
                              const int16_t* HWY_RESTRICT block, size_t areaStride) {
-    const hn::ScalableTag<int16_t> d16;
+    const WindowTag d16;
     const hn::Repartition<int32_t, decltype(d16)> d32;
     const size_t lanes = hn::Lanes(d16);
     auto sum0 = hn::Zero(d32);
@@ -43,10 +47,38 @@ HWY_INLINE int32_t WindowDot(const int16_t* HWY_RESTRICT window, size_t paddedWi
     return hn::GetLane(hn::SumOfLanes(d32, hn::Add(sum0, sum1)));
 }
 
+// WindowDot for four neighbouring blocks at once: each window vector is loaded once and the
+// four independent sums keep the multipliers busy.
+HWY_INLINE void FourWindowDots(const int16_t* HWY_RESTRICT window, size_t paddedWidth, int height,
+                               const int16_t* HWY_RESTRICT block, size_t areaStride, int32_t* dots) {
+    const WindowTag d16;
+    const hn::Repartition<int32_t, decltype(d16)> d32;
+    const size_t lanes = hn::Lanes(d16);
+    auto sum0 = hn::Zero(d32), sum1 = hn::Zero(d32), sum2 = hn::Zero(d32), sum3 = hn::Zero(d32);
+    auto odd0 = hn::Zero(d32), odd1 = hn::Zero(d32), odd2 = hn::Zero(d32), odd3 = hn::Zero(d32);
+    for (int row = 0; row < height; ++row) {
+        const int16_t* w = window + row * paddedWidth;
+        const int16_t* x = block + row * areaStride;
+        for (size_t k = 0; k < paddedWidth; k += lanes) {
+            const auto weights = hn::Load(d16, w + k);
+            sum0 = hn::ReorderWidenMulAccumulate(d32, weights, hn::LoadU(d16, x + k), sum0, odd0);
+            sum1 = hn::ReorderWidenMulAccumulate(d32, weights, hn::LoadU(d16, x + k + 1), sum1, odd1);
+            sum2 = hn::ReorderWidenMulAccumulate(d32, weights, hn::LoadU(d16, x + k + 2), sum2, odd2);
+            sum3 = hn::ReorderWidenMulAccumulate(d32, weights, hn::LoadU(d16, x + k + 3), sum3, odd3);
+        }
+    }
+    dots[0] = hn::GetLane(hn::SumOfLanes(d32, hn::Add(sum0, odd0)));
+    dots[1] = hn::GetLane(hn::SumOfLanes(d32, hn::Add(sum1, odd1)));
+    dots[2] = hn::GetLane(hn::SumOfLanes(d32, hn::Add(sum2, odd2)));
+    dots[3] = hn::GetLane(hn::SumOfLanes(d32, hn::Add(sum3, odd3)));
+}
+
 // Window dot products for `count` consecutive block positions along one area row.
 void RowOfWindowDots(const int16_t* window, size_t paddedWidth, int height, const int16_t* areaRow,
                      size_t areaStride, int count, int32_t* dots) {
-    for (int j = 0; j < count; ++j) dots[j] = WindowDot(window, paddedWidth, height, areaRow + j, areaStride);
+    int j = 0;
+    for (; j + 4 <= count; j += 4) FourWindowDots(window, paddedWidth, height, areaRow + j, areaStride, dots + j);
+    for (; j < count; ++j) dots[j] = WindowDot(window, paddedWidth, height, areaRow + j, areaStride);
 }
 
 // Dot product of each window row with the matching block row.
