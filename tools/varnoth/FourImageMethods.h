@@ -24,6 +24,10 @@ inline const std::vector<FourImageMethod>& FourImageMethods() {
          [](CHologramsRemove& r, const CImage* const s[4], CImage& out) {
              r.HologramsRemove4Img3(*s[0], *s[1], *s[2], *s[3], out);
          }},
+        {"hsv", "lowest saturation among the unsaturated shots, hue and value of a chosen one, per pyramid level",
+         [](CHologramsRemove& r, const CImage* const s[4], CImage& out) {
+             r.HologramsRemove4Img4(*s[0], *s[1], *s[2], *s[3], out);
+         }},
         {"brightness", "one raster pass: rebuild from the smoothest gradients, then the shot of closest colour",
          [](CHologramsRemove& r, const CImage* const s[4], CImage& out) {
              r.HologramsRemove4Img2(*s[0], *s[1], *s[2], *s[3], out);
