@@ -96,20 +96,50 @@ void CCheatIR::BuildBaseWin(const CPoint& point, const CImage& image, Window& wi
 
 float CCheatIR::Grade(const Window& a, const Window& b) { return channels::GradeWindows(a.data(), b.data()); }
 
+namespace {
+
+// The square of window centres within +-10 of the point that keep their whole window inside.
+struct SearchSquare {
+    int firstRow, lastRow, firstCol, lastCol;
+    SearchSquare(const CPoint& p, const CImage& channel)
+        : firstRow(std::max(p.y - kSearch, kCentreMargin)),
+          lastRow(std::min(p.y + kSearch, channel.GetHeight() - 1 - kCentreMargin)),
+          firstCol(std::max(p.x - kSearch, kCentreMargin)),
+          lastCol(std::min(p.x + kSearch, channel.GetWidth() - 1 - kCentreMargin)) {}
+};
+
+}  // namespace
+
+void channels::BuildLocalMapPlain(const CPoint& point, const CImage& channel, const uint8_t* reference, float* map) {
+    const ReferenceStats ref = MakeReferenceStats(reference);
+    const SearchSquare square(point, channel);
+    uint8_t candidate[kWindowSize];
+    int k = 0;
+    for (int v = square.firstRow; v <= square.lastRow; ++v) {
+        for (int u = square.firstCol; u <= square.lastCol; ++u) {
+            for (int i = 0; i < kWindowSide; ++i) {
+                const uint8_t* row = channel.GetPtrXY(0, v - kWindowHalf + i) + u - kWindowHalf;
+                std::copy(row, row + kWindowSide, candidate + kWindowSide * i);
+            }
+            map[k++] = GradeAgainst(candidate, ref);
+        }
+    }
+}
+
+// Row-major over the clipped square, packed from entry 0; unwritten entries keep their zeros.
+// Every window lies wholly inside the channel, so a map row is graded straight from the
+// channel's rows.
 void CCheatIR::BuildLocalMap(const CPoint& point, const CImage& channel, const Window& reference, GradeMap& map) {
     const channels::ReferenceStats ref = channels::MakeReferenceStats(reference.data());
-    Window candidate(kWindowSize);
-    const int firstRow = std::max(point.y - kSearch, kCentreMargin);
-    const int lastRow = std::min(point.y + kSearch, channel.GetHeight() - 1 - kCentreMargin);
-    const int firstCol = std::max(point.x - kSearch, kCentreMargin);
-    const int lastCol = std::min(point.x + kSearch, channel.GetWidth() - 1 - kCentreMargin);
-    // Row-major over the clipped square, packed from entry 0; unwritten entries keep their zeros.
+    const SearchSquare square(point, channel);
+    const int count = square.lastCol - square.firstCol + 1;
+    if (count <= 0) return;
     int k = 0;
-    for (int v = firstRow; v <= lastRow; ++v) {
-        for (int u = firstCol; u <= lastCol; ++u) {
-            BuildBaseWin(CPoint(u, v), channel, candidate);
-            map[k++] = channels::GradeAgainst(candidate.data(), ref);
-        }
+    for (int v = square.firstRow; v <= square.lastRow; ++v, k += count) {
+        const uint8_t* rows[kWindowSide];
+        for (int i = 0; i < kWindowSide; ++i)
+            rows[i] = channel.GetPtrXY(0, v - kWindowHalf + i) + square.firstCol - kWindowHalf;
+        channels::GradeRowFast(rows, count, ref, map.data() + k);
     }
 }
 

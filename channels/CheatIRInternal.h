@@ -72,4 +72,15 @@ ReferenceStats MakeReferenceStats(const uint8_t* window);
 float GradeAgainst(const uint8_t* window, const ReferenceStats& ref);
 float GradeWindows(const uint8_t* a, const uint8_t* b);
 
+// One row of a grade map: out[c] grades the 5 x 5 window whose top-left pixel is rows[0][c]
+// (rows[i] being the window's row i) against the reference, for c below count. The plain
+// version copies each window and calls GradeAgainst; the fast one grades a vector of
+// positions at once with the same float operations in the same order.
+void GradeRowPlain(const uint8_t* const* rows, int count, const ReferenceStats& ref, float* out);
+void GradeRowFast(const uint8_t* const* rows, int count, const ReferenceStats& ref, float* out);
+
+// BuildLocalMap's definition: one BuildBaseWin-style copy and one grade per position of the
+// clipped square, packed from entry 0.
+void BuildLocalMapPlain(const CPoint& point, const CImage& channel, const uint8_t* reference, float* map);
+
 }  // namespace channels

@@ -1,8 +1,11 @@
 #include <gtest/gtest.h>
 
 #include <cstdlib>
+#include <cstring>
 #include <filesystem>
 #include <random>
+
+#include <hwy/targets.h>
 
 #include "channels/CheatIRTestAccess.h"
 
@@ -89,6 +92,28 @@ TEST(BuildLocalMap, PlacesOffsetsInsideAndPacksThemAtTheBorder) {
     Access::BuildBaseWin(cheat, CPoint(15, 60), img, win);
     EXPECT_EQ(packed[21 * 14 - 1], Access::Grade(cheat, win, ref));
     for (int k = 21 * 14; k < 441; ++k) EXPECT_EQ(packed[k], 0.0f);
+}
+
+TEST(BuildLocalMap, FastGradingEqualsThePlainDefinitionBitForBit) {
+    CCheatIR cheat;
+    for (int64_t target : hwy::SupportedAndGeneratedTargets()) {
+    hwy::SetSupportedTargetsForTest(target);
+    for (auto [w, h] : {std::pair{37, 29}, std::pair{64, 50}, std::pair{23, 9}}) {
+        CImage img = Noise(w, h, static_cast<unsigned>(w));
+        Fill(img, 3, 3, 12, 8, 90);  // flat windows grade NaN -> 0 on both paths
+        for (int y = 0; y < h; y += 3)
+            for (int x = 0; x < w; x += 2) {
+                Access::Window ref(25);
+                Access::GradeMap fast(441), plain(441);
+                Access::BuildBaseWin(cheat, CPoint(x, y), img, ref);
+                Access::BuildLocalMap(cheat, CPoint(x, y), img, ref, fast);
+                channels::BuildLocalMapPlain(CPoint(x, y), img, ref.data(), plain.data());
+                ASSERT_EQ(std::memcmp(fast.data(), plain.data(), 441 * sizeof(float)), 0)
+                    << hwy::TargetName(target) << " " << w << " " << x << "," << y;
+            }
+    }
+    }
+    hwy::SetSupportedTargetsForTest(0);
 }
 
 TEST(ChannelMatchAndWarp, WritesNothingWithoutSegmentsAndWhiteForPointlessOnes) {
