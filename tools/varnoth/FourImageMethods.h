@@ -1,5 +1,6 @@
 #pragma once
 
+#include <cstdint>
 #include <string>
 #include <vector>
 
@@ -23,6 +24,10 @@ inline const std::vector<FourImageMethod>& FourImageMethods() {
         {"pyramid3", "take the weakest detail among the candidates below brightness 250",
          [](CHologramsRemove& r, const CImage* const s[4], CImage& out) {
              r.HologramsRemove4Img3(*s[0], *s[1], *s[2], *s[3], out);
+         }},
+        {"steps", "the pyramid rules fed one shot per call, deciding from running per-pixel statistics",
+         [](CHologramsRemove& r, const CImage* const s[4], CImage& out) {
+             for (uint16_t step = 0; step < 4; ++step) r.HologramsRemove4ImgInSteps(*s[step], step, out);
          }},
         {"hsv", "lowest saturation among the unsaturated shots, hue and value of a chosen one, per pyramid level",
          [](CHologramsRemove& r, const CImage* const s[4], CImage& out) {
