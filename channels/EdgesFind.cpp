@@ -71,10 +71,24 @@ inline int16_t Derivative(int minus2, int minus1, int plus1, int plus2) {
     return static_cast<int16_t>(2 * (plus2 - minus2) + plus1 - minus1);
 }
 
-inline void Count(CSafeArray<uint32_t>& histogram, int16_t d) {
-    const int magnitude = std::abs(static_cast<int>(d));
-    ++histogram[magnitude < 255 ? magnitude : 255];
-}
+// Counts |D| limited to 255. Four interleaved tables keep successive counts of one level from
+// waiting on each other; Merge adds them into the histogram.
+class MagnitudeCounter {
+public:
+    void Count(const int16_t* d, int begin, int end) {
+        for (int x = begin; x < end; ++x) {
+            const int magnitude = std::abs(static_cast<int>(d[x]));
+            ++m_tables[x & 3][magnitude < 255 ? magnitude : 255];
+        }
+    }
+    void MergeInto(CSafeArray<uint32_t>& histogram) const {
+        for (int level = 0; level < kHistogramSize; ++level)
+            histogram[level] = m_tables[0][level] + m_tables[1][level] + m_tables[2][level] + m_tables[3][level];
+    }
+
+private:
+    uint32_t m_tables[4][kHistogramSize] = {};
+};
 
 // The largest magnitude level whose count reaches a tenth of the zero-derivative count.
 int ThresholdFromHistogram(const CSafeArray<uint32_t>& histogram) {
@@ -85,10 +99,6 @@ int ThresholdFromHistogram(const CSafeArray<uint32_t>& histogram) {
     return 0;
 }
 
-void ClearHistogram(CSafeArray<uint32_t>& histogram) {
-    for (int i = 0; i < kHistogramSize; ++i) histogram[i] = 0;
-}
-
 // Marks of weak derivatives go back to "no edge".
 void DropWeakPeaks(const CImage& deriv, CImage& edges, int threshold) {
     const int width = deriv.GetWidth();
@@ -96,7 +106,8 @@ void DropWeakPeaks(const CImage& deriv, CImage& edges, int threshold) {
         const int16_t* d = channels::Row16(deriv, y);
         uint8_t* e = edges.GetPtrXY(0, y);
         for (int x = 0; x < width; ++x) {
-            if (e[x] != kNoEdge && std::abs(static_cast<int>(d[x])) < threshold) e[x] = kNoEdge;
+            const bool weak = std::abs(static_cast<int>(d[x])) < threshold;
+            e[x] = weak ? kNoEdge : e[x];  // a select, so the loop vectorises
         }
     }
 }
@@ -113,23 +124,27 @@ void CCheatIR::EdgesFind(CImage& derivRows, CImage& derivCols, CImage& edgesRows
     edgesRows.Set(kNoEdge);
     edgesCols.Set(kNoEdge);
 
+    // The histogram counts the same positions whatever the order, so each row's derivatives
+    // are computed first, then counted, then walked by the run-peak rule.
+    MagnitudeCounter rowCounts;
     for (int y = 0; y < height; ++y) {
         const uint8_t* p = source.GetPtrXY(0, y);
         int16_t* d = channels::Row16(derivRows, y);
         uint8_t* e = edgesRows.GetPtrXY(0, y);
+        for (int x = 2; x <= width - 3; ++x) d[x] = Derivative(p[x - 2], p[x - 1], p[x + 1], p[x + 2]);
+        rowCounts.Count(d, 2, width - 2);
         RunPeakMarker marker;
         for (int x = 2; x <= width - 3; ++x) {
-            d[x] = Derivative(p[x - 2], p[x - 1], p[x + 1], p[x + 2]);
             const int peak = marker.Step(d[x], x);
             if (peak >= 0) e[peak] = marker.Mark();
-            Count(histogram, d[x]);
         }
     }
+    rowCounts.MergeInto(histogram);
     const int rowThreshold = ThresholdFromHistogram(histogram);
 
     // Every column keeps its own marker, so the columns are walked side by side, a row at a
-    // time, each with increasing y; the histogram only counts, so the order is free.
-    ClearHistogram(histogram);
+    // time, each with increasing y.
+    MagnitudeCounter columnCounts;
     std::vector<RunPeakMarker> markers(static_cast<size_t>(width > 0 ? width : 0));
     for (int y = 2; y <= height - 3; ++y) {
         const uint8_t* up2 = source.GetPtrXY(0, y - 2);
@@ -137,13 +152,14 @@ void CCheatIR::EdgesFind(CImage& derivRows, CImage& derivCols, CImage& edgesRows
         const uint8_t* down1 = source.GetPtrXY(0, y + 1);
         const uint8_t* down2 = source.GetPtrXY(0, y + 2);
         int16_t* d = channels::Row16(derivCols, y);
+        for (int x = 0; x < width; ++x) d[x] = Derivative(up2[x], up1[x], down1[x], down2[x]);
+        columnCounts.Count(d, 0, width);
         for (int x = 0; x < width; ++x) {
-            d[x] = Derivative(up2[x], up1[x], down1[x], down2[x]);
             const int peak = markers[x].Step(d[x], y);
             if (peak >= 0) edgesCols.GetPtrXY(0, peak)[x] = markers[x].Mark();
-            Count(histogram, d[x]);
         }
     }
+    columnCounts.MergeInto(histogram);
     const int columnThreshold = ThresholdFromHistogram(histogram);
 
     DropWeakPeaks(derivRows, edgesRows, rowThreshold);
