@@ -1,36 +1,244 @@
-// WarpAffine's sampling: 16.16 bilinear with the 254 cap. The plain loop is the definition;
-// the fast one splits output rows among threads and walks memory through row pointers.
-// Positions advance with wrapping 32-bit additions, so row r of the fast loop starts at
-// start + r·rowStep (mod 2^32), the same value the plain loop reaches by r additions.
+// WarpAffine's sampling: 16.16 bilinear with the 254 cap. sampleAffinePlain is the
+// definition. The fast path splits output rows among threads; within a row, groups of
+// pixels whose four source neighbours all lie inside src are sampled with Highway vectors
+// (gathered source words, the same integer weights), every other pixel by the scalar rule.
+// Positions advance with wrapping 32-bit additions, so pixel i of row r sits at
+// start + r·rowStep + i·colStep (mod 2^32), the value the plain loop reaches by additions.
+#undef HWY_TARGET_INCLUDE
+#define HWY_TARGET_INCLUDE "geometry/WarpAffineKernels.cpp"
+#include <hwy/foreach_target.h>  // IWYU pragma: keep
+#include <hwy/highway.h>
 
 #include <algorithm>
+#include <cstring>
 
 #include "geometry/GeometryInternal.h"
 #include "imagelib/Parallel.h"
 
+#ifndef VARNOTH_GEOMETRY_AFFINE_SOURCE
+#define VARNOTH_GEOMETRY_AFFINE_SOURCE
 namespace geometry {
-namespace {
 
-struct BilinearWeights {
-    int32_t w00, w10, w01, w11;
+// What a row kernel needs of src.
+struct AffineSource {
+    const uint8_t* bits = nullptr;  // lowest address: the bottom row
+    const uint8_t* row0 = nullptr;  // pixel (0, 0)
+    ptrdiff_t down = 0;             // bytes from row y to row y + 1 (negative: rows are bottom-up)
+    int32_t span = 0;
+    int32_t width = 0, height = 0;
+    bool vectorOffsets = false;  // every byte offset fits a 32-bit gather index
 };
 
-inline BilinearWeights weightsOf(int32_t X, int32_t Y) {
-    const int32_t u = X & 0xFFFF, v = Y & 0xFFFF;
-    const int32_t left = (65536 - u) >> 1, right = u >> 1;
-    const int32_t top = (65536 - v) >> 1, bottom = v >> 1;
-    return {(left * top) >> 14, (right * top) >> 14, (left * bottom) >> 14, (right * bottom) >> 14};
+// One output row: `cols` pixels from 16.16 position (x, y), stepping by (stepX, stepY).
+struct AffineRow {
+    uint8_t* out = nullptr;
+    int cols = 0;
+    uint32_t x = 0, y = 0, stepX = 0, stepY = 0;
+};
+
+}  // namespace geometry
+#endif
+
+HWY_BEFORE_NAMESPACE();
+namespace geometry {
+namespace HWY_NAMESPACE {
+namespace hn = hwy::HWY_NAMESPACE;
+
+template <int BPP>
+HWY_INLINE void samplePixelScalar(const AffineSource& s, uint32_t X, uint32_t Y, uint8_t* out) {
+    const int32_t sx = static_cast<int32_t>(X) >> 16, sy = static_cast<int32_t>(Y) >> 16;
+    // One unsigned compare per axis covers both "negative" and "beyond the last".
+    if (static_cast<uint32_t>(sx) >= static_cast<uint32_t>(s.width) ||
+        static_cast<uint32_t>(sy) >= static_cast<uint32_t>(s.height))
+        return;
+    const uint8_t* p00 = s.row0 + sy * s.down + sx * BPP;
+    if (sx + 1 < s.width && sy + 1 < s.height) {
+        const int32_t u = static_cast<int32_t>(X & 0xFFFF), v = static_cast<int32_t>(Y & 0xFFFF);
+        const int32_t left = (65536 - u) >> 1, right = u >> 1, top = (65536 - v) >> 1, bottom = v >> 1;
+        const int32_t w00 = (left * top) >> 14, w10 = (right * top) >> 14;
+        const int32_t w01 = (left * bottom) >> 14, w11 = (right * bottom) >> 14;
+        const uint8_t* p01 = p00 + s.down;
+        for (int c = 0; c < BPP; ++c)
+            out[c] = static_cast<uint8_t>(
+                std::min(254, (p00[c] * w00 + p00[c + BPP] * w10 + p01[c] * w01 + p01[c + BPP] * w11) >> 16));
+    } else {
+        for (int c = 0; c < BPP; ++c) out[c] = std::min<uint8_t>(p00[c], 254);
+    }
 }
 
-inline unsigned char blend(int s00, int s10, int s01, int s11, const BilinearWeights& w) {
-    return static_cast<unsigned char>(std::min(254, (s00 * w.w00 + s10 * w.w10 + s01 * w.w01 + s11 * w.w11) >> 16));
+template <int BPP>
+HWY_INLINE void sampleScalar(const AffineSource& s, uint8_t* out, int count, uint32_t X, uint32_t Y,
+                             uint32_t stepX, uint32_t stepY) {
+    for (int i = 0; i < count; ++i, out += BPP, X += stepX, Y += stepY) samplePixelScalar<BPP>(s, X, Y, out);
 }
 
-inline unsigned char capped(unsigned char b) { return std::min<unsigned char>(b, 254); }
+#if HWY_TARGET != HWY_SCALAR
+// One-lane targets take the scalar rule for every pixel.
+using D32 = hn::ScalableTag<int32_t>;
+using V32 = hn::Vec<D32>;
+using M32 = hn::Mask<D32>;
+constexpr size_t kMaxLanes = HWY_MAX_BYTES / sizeof(int32_t);
 
-uint32_t asBits(int32_t v) { return static_cast<uint32_t>(v); }
+HWY_INLINE V32 byteOf(V32 word, int index) {
+    const D32 d;
+    return hn::And(hn::ShiftRightSame(word, 8 * index), hn::Set(d, 0xFF));
+}
 
-}  // namespace
+// min(254, (s00·w00 + s10·w10 + s01·w01 + s11·w11) >> 16) per lane.
+HWY_INLINE V32 blend(V32 s00, V32 s10, V32 s01, V32 s11, V32 w00, V32 w10, V32 w01, V32 w11) {
+    const D32 d;
+    const V32 sum = hn::Add(hn::Add(hn::Mul(s00, w00), hn::Mul(s10, w10)), hn::Add(hn::Mul(s01, w01), hn::Mul(s11, w11)));
+    return hn::Min(hn::ShiftRight<16>(sum), hn::Set(d, 254));
+}
+
+// Writes the B, G, R bytes of each lane (its low three bytes) to consecutive pixels: every
+// 128-bit block is packed to 12 bytes in the register, then copied.
+HWY_INLINE void storeColourPixels(V32 pixels, uint8_t* out) {
+    const D32 d;
+    const hn::Repartition<uint8_t, D32> d8;
+    alignas(16) static constexpr uint8_t kPack[16] = {0, 1, 2, 4, 5, 6, 8, 9, 10, 12, 13, 14, 15, 15, 15, 15};
+    HWY_ALIGN uint8_t packed[HWY_MAX_BYTES];
+    const auto bytes = hn::BitCast(d8, pixels);
+    hn::Store(hn::TableLookupBytes(bytes, hn::LoadDup128(d8, kPack)), d8, packed);
+    const int blocks = static_cast<int>(hn::Lanes(d)) / 4;
+    for (int block = 0; block < blocks; ++block) std::memcpy(out + 12 * block, packed + 16 * block, 12);
+}
+
+// Reads, for every lane, the pixel at `at` and its right neighbour: colour lanes as the eight
+// bytes ending at the neighbour (two bytes of pixel sx - 1, then B G R B G R) split into a
+// low and a high word; grey lanes as one word holding the two bytes. Gathers are slow on the
+// machines we measured, so each lane is one scalar load.
+template <int BPP>
+HWY_INLINE void loadNeighbourPairs(const uint8_t* bits, V32 at, V32& low, V32& high) {
+    const D32 d;
+    HWY_ALIGN int32_t offsets[kMaxLanes], lows[kMaxLanes], highs[kMaxLanes];
+    const int lanes = static_cast<int>(hn::Lanes(d));
+    if constexpr (BPP == 3) {
+        hn::Store(hn::Sub(at, hn::Set(d, 2)), d, offsets);
+        for (int j = 0; j < lanes; ++j) {
+            uint64_t pair;
+            std::memcpy(&pair, bits + offsets[j], 8);
+            lows[j] = static_cast<int32_t>(static_cast<uint32_t>(pair));
+            highs[j] = static_cast<int32_t>(static_cast<uint32_t>(pair >> 32));
+        }
+        high = hn::Load(d, highs);
+    } else {
+        hn::Store(at, d, offsets);
+        for (int j = 0; j < lanes; ++j) {
+            uint16_t pair;
+            std::memcpy(&pair, bits + offsets[j], 2);
+            lows[j] = pair;
+        }
+    }
+    low = hn::Load(d, lows);
+}
+
+// Bilinear bytes of every lane, packed B | G << 8 | R << 16 (grey in the low byte). Lanes
+// outside `usable` read the first source bytes instead and give meaningless values.
+template <int BPP>
+HWY_INLINE V32 sampleLanes(const AffineSource& s, V32 vx, V32 vy, M32 usable) {
+    const D32 d;
+    const V32 sx = hn::ShiftRight<16>(vx), sy = hn::ShiftRight<16>(vy);
+    const V32 k65536 = hn::Set(d, 65536), kLow = hn::Set(d, 0xFFFF);
+    const V32 u = hn::And(vx, kLow), v = hn::And(vy, kLow);
+    const V32 left = hn::ShiftRight<1>(hn::Sub(k65536, u)), right = hn::ShiftRight<1>(u);
+    const V32 top = hn::ShiftRight<1>(hn::Sub(k65536, v)), bottom = hn::ShiftRight<1>(v);
+    const V32 w00 = hn::ShiftRight<14>(hn::Mul(left, top)), w10 = hn::ShiftRight<14>(hn::Mul(right, top));
+    const V32 w01 = hn::ShiftRight<14>(hn::Mul(left, bottom)), w11 = hn::ShiftRight<14>(hn::Mul(right, bottom));
+    const V32 span = hn::Set(d, s.span);
+    const V32 firstByte = hn::Set(d, BPP == 3 ? 2 : 0);  // a safe place to read for unusable lanes
+    const V32 at00 = hn::IfThenElse(
+        usable, hn::Add(hn::Mul(hn::Sub(hn::Set(d, s.height - 1), sy), span), hn::Mul(sx, hn::Set(d, BPP))), firstByte);
+    const V32 at01 = hn::IfThenElse(usable, hn::Sub(at00, span), firstByte);
+    V32 low00, high00, low01, high01;
+    loadNeighbourPairs<BPP>(s.bits, at00, low00, high00);
+    loadNeighbourPairs<BPP>(s.bits, at01, low01, high01);
+    if constexpr (BPP == 3) {
+        const V32 blue = blend(byteOf(low00, 2), byteOf(high00, 1), byteOf(low01, 2), byteOf(high01, 1), w00, w10, w01, w11);
+        const V32 green = blend(byteOf(low00, 3), byteOf(high00, 2), byteOf(low01, 3), byteOf(high01, 2), w00, w10, w01, w11);
+        const V32 red = blend(byteOf(high00, 0), byteOf(high00, 3), byteOf(high01, 0), byteOf(high01, 3), w00, w10, w01, w11);
+        return hn::Or(hn::Or(blue, hn::ShiftLeft<8>(green)), hn::ShiftLeft<16>(red));
+    } else {
+        return blend(byteOf(low00, 0), byteOf(low00, 1), byteOf(low01, 0), byteOf(low01, 1), w00, w10, w01, w11);
+    }
+}
+
+// A group of pixels whose lanes are not all usable: usable lanes from the vector result,
+// the others by the scalar rule (edges of src, outside src).
+template <int BPP>
+HWY_INLINE void storeMixedGroup(const AffineSource& s, V32 result, M32 usable, uint8_t* out, uint32_t X,
+                                uint32_t Y, uint32_t stepX, uint32_t stepY) {
+    const D32 d;
+    HWY_ALIGN int32_t values[kMaxLanes], flags[kMaxLanes];
+    hn::Store(result, d, values);
+    hn::Store(hn::VecFromMask(d, usable), d, flags);
+    const int lanes = static_cast<int>(hn::Lanes(d));
+    for (int j = 0; j < lanes; ++j, out += BPP, X += stepX, Y += stepY) {
+        if (flags[j] != 0)
+            std::memcpy(out, &values[j], BPP);
+        else
+            samplePixelScalar<BPP>(s, X, Y, out);
+    }
+}
+
+#endif
+
+template <int BPP>
+void sampleRow(const AffineSource& s, const AffineRow& row) {
+    uint8_t* out = row.out;
+    uint32_t X = row.x, Y = row.y;
+    int i = 0;
+#if HWY_TARGET != HWY_SCALAR
+    const D32 d;
+    const hn::RebindToUnsigned<D32> du;
+    const int lanes = static_cast<int>(hn::Lanes(d));
+    if (s.vectorOffsets && s.width >= 4 && s.height >= 2) {
+        const V32 laneX = hn::Mul(hn::Iota(d, 0), hn::Set(d, static_cast<int32_t>(row.stepX)));
+        const V32 laneY = hn::Mul(hn::Iota(d, 0), hn::Set(d, static_cast<int32_t>(row.stepY)));
+        const uint32_t groupX = row.stepX * static_cast<uint32_t>(lanes), groupY = row.stepY * static_cast<uint32_t>(lanes);
+        // Vector lanes need sx + 1 < W and sy + 1 < H; colour pixels are read from two bytes
+        // before them, so they also need sx >= 1 to stay inside the row.
+        const int firstX = BPP == 3 ? 1 : 0;
+        const auto xRange = hn::Set(du, static_cast<uint32_t>(s.width - 1 - firstX));
+        const auto yRange = hn::Set(du, static_cast<uint32_t>(s.height - 1));
+        for (; i + lanes <= row.cols; i += lanes, X += groupX, Y += groupY, out += lanes * BPP) {
+            const V32 vx = hn::Add(hn::Set(d, static_cast<int32_t>(X)), laneX);
+            const V32 vy = hn::Add(hn::Set(d, static_cast<int32_t>(Y)), laneY);
+            const V32 sx = hn::ShiftRight<16>(vx), sy = hn::ShiftRight<16>(vy);
+            const auto usableU = hn::And(hn::Lt(hn::BitCast(du, hn::Sub(sx, hn::Set(d, firstX))), xRange),
+                                         hn::Lt(hn::BitCast(du, sy), yRange));
+            const M32 usable = hn::RebindMask(d, usableU);
+            if (hn::AllFalse(d, usable)) {
+                sampleScalar<BPP>(s, out, lanes, X, Y, row.stepX, row.stepY);
+                continue;
+            }
+            const V32 result = sampleLanes<BPP>(s, vx, vy, usable);
+            if (!hn::AllTrue(d, usable)) {
+                storeMixedGroup<BPP>(s, result, usable, out, X, Y, row.stepX, row.stepY);
+            } else if constexpr (BPP == 3) {
+                storeColourPixels(result, out);
+            } else {
+                const hn::Rebind<uint8_t, D32> d8;
+                hn::StoreU(hn::DemoteTo(d8, result), d8, out);
+            }
+        }
+    }
+#endif
+    sampleScalar<BPP>(s, out, row.cols - i, X, Y, row.stepX, row.stepY);
+}
+
+void SampleAffineRowGrey(const AffineSource& s, const AffineRow& row) { sampleRow<1>(s, row); }
+void SampleAffineRowColour(const AffineSource& s, const AffineRow& row) { sampleRow<3>(s, row); }
+
+}  // namespace HWY_NAMESPACE
+}  // namespace geometry
+HWY_AFTER_NAMESPACE();
+
+#if HWY_ONCE
+namespace geometry {
+
+HWY_EXPORT(SampleAffineRowGrey);
+HWY_EXPORT(SampleAffineRowColour);
 
 void sampleAffinePlain(const CImage& src, CImage& dst, const AffineSampling& s) {
     const int W = src.GetWidth(), H = src.GetHeight(), bpp = src.GetBitCount() / 8;
@@ -46,10 +254,16 @@ void sampleAffinePlain(const CImage& src, CImage& dst, const AffineSampling& s) 
                     const unsigned char* p10 = src.GetPtrXY(sx + 1, sy);
                     const unsigned char* p01 = src.GetPtrXY(sx, sy + 1);
                     const unsigned char* p11 = src.GetPtrXY(sx + 1, sy + 1);
-                    const BilinearWeights w = weightsOf(X, Y);
-                    for (int c = 0; c < bpp; ++c) out[c] = blend(p00[c], p10[c], p01[c], p11[c], w);
+                    const int u = X & 0xFFFF, v = Y & 0xFFFF;
+                    const int w00 = ((65536 - u) >> 1) * ((65536 - v) >> 1) >> 14;
+                    const int w10 = (u >> 1) * ((65536 - v) >> 1) >> 14;
+                    const int w01 = ((65536 - u) >> 1) * (v >> 1) >> 14;
+                    const int w11 = (u >> 1) * (v >> 1) >> 14;
+                    for (int c = 0; c < bpp; ++c)
+                        out[c] = static_cast<unsigned char>(
+                            std::min(254, (p00[c] * w00 + p10[c] * w10 + p01[c] * w01 + p11[c] * w11) >> 16));
                 } else {
-                    for (int c = 0; c < bpp; ++c) out[c] = capped(p00[c]);
+                    for (int c = 0; c < bpp; ++c) out[c] = std::min<unsigned char>(p00[c], 254);
                 }
             }
             X = wrapAdd(X, s.colStepX);
@@ -60,53 +274,39 @@ void sampleAffinePlain(const CImage& src, CImage& dst, const AffineSampling& s) 
     }
 }
 
-namespace {
-
-template <int BPP>
-void sampleAffineRow(const PixelGrid& in, int W, int H, unsigned char* out, int cols, uint32_t X, uint32_t Y,
-                     uint32_t stepX, uint32_t stepY) {
-    const ptrdiff_t down = in.rowStep;
-    for (int i = 0; i < cols; ++i, out += BPP, X += stepX, Y += stepY) {
-        const int32_t sx = static_cast<int32_t>(X) >> 16, sy = static_cast<int32_t>(Y) >> 16;
-        // One unsigned compare per axis covers both "negative" and "beyond the last".
-        if (static_cast<uint32_t>(sx) >= static_cast<uint32_t>(W) || static_cast<uint32_t>(sy) >= static_cast<uint32_t>(H))
-            continue;
-        const unsigned char* p00 = in.row0 + sy * down + sx * BPP;
-        if (sx + 1 < W && sy + 1 < H) {
-            const BilinearWeights w = weightsOf(static_cast<int32_t>(X), static_cast<int32_t>(Y));
-            const unsigned char* p01 = p00 + down;
-            for (int c = 0; c < BPP; ++c) out[c] = blend(p00[c], p00[c + BPP], p01[c], p01[c + BPP], w);
-        } else {
-            for (int c = 0; c < BPP; ++c) out[c] = capped(p00[c]);
-        }
-    }
-}
-
-template <int BPP>
-void sampleAffineRows(const CImage& src, CImage& dst, const AffineSampling& s) {
-    const PixelGrid in = PixelGrid::of(src), out = PixelGrid::of(dst);
-    const int W = src.GetWidth(), H = src.GetHeight();
+void sampleAffineFast(const CImage& src, CImage& dst, const AffineSampling& s) {
+    AffineSource source;
+    source.bits = src.GetBits();
+    source.row0 = src.GetPtrXY(0, 0);
+    source.down = -static_cast<ptrdiff_t>(src.GetSpan());
+    source.span = src.GetSpan();
+    source.width = src.GetWidth();
+    source.height = src.GetHeight();
+    source.vectorOffsets = src.GetSize() < (static_cast<size_t>(1) << 31) - 64;
+    const PixelGrid out = PixelGrid::of(dst);
+    const bool grey = src.GetBitCount() == 8;
+    const uint32_t startX = static_cast<uint32_t>(s.startX), startY = static_cast<uint32_t>(s.startY);
+    const uint32_t rowStepX = static_cast<uint32_t>(s.rowStepX), rowStepY = static_cast<uint32_t>(s.rowStepY);
     const int rowsPerTask = std::max(1, 16384 / std::max(1, s.cols));
     imagelib::ParallelFor(
         0, s.rows,
         [&](int begin, int end) {
             for (int r = begin; r < end; ++r) {
-                const uint32_t X = asBits(s.startX) + asBits(r) * asBits(s.rowStepX);
-                const uint32_t Y = asBits(s.startY) + asBits(r) * asBits(s.rowStepY);
-                sampleAffineRow<BPP>(in, W, H, out.at(s.firstOutCol, s.firstOutRow + r), s.cols, X, Y,
-                                     asBits(s.colStepX), asBits(s.colStepY));
+                AffineRow row;
+                row.out = out.at(s.firstOutCol, s.firstOutRow + r);
+                row.cols = s.cols;
+                row.x = startX + static_cast<uint32_t>(r) * rowStepX;
+                row.y = startY + static_cast<uint32_t>(r) * rowStepY;
+                row.stepX = static_cast<uint32_t>(s.colStepX);
+                row.stepY = static_cast<uint32_t>(s.colStepY);
+                if (grey)
+                    HWY_DYNAMIC_DISPATCH(SampleAffineRowGrey)(source, row);
+                else
+                    HWY_DYNAMIC_DISPATCH(SampleAffineRowColour)(source, row);
             }
         },
         rowsPerTask);
 }
 
-}  // namespace
-
-void sampleAffineFast(const CImage& src, CImage& dst, const AffineSampling& s) {
-    if (src.GetBitCount() == 8)
-        sampleAffineRows<1>(src, dst, s);
-    else
-        sampleAffineRows<3>(src, dst, s);
-}
-
 }  // namespace geometry
+#endif  // HWY_ONCE

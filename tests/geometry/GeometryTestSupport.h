@@ -1,0 +1,57 @@
+#pragma once
+
+#include <cstdint>
+#include <cstring>
+#include <string>
+#include <vector>
+
+#include "imagelib/CImage.h"
+#include "imagelib/Trace.h"
+
+namespace geometry_test {
+
+// Deterministic pixels; values stay below `limit`.
+inline CImage noiseImage(int width, int height, int bits, uint32_t seed = 1, int limit = 256) {
+    CImage img(width, height, bits);
+    uint32_t state = seed * 2654435761u + 1;
+    for (int y = 0; y < height; ++y) {
+        unsigned char* p = img.GetPtrXY(0, y);
+        for (int i = 0; i < width * bits / 8; ++i) {
+            state = state * 1664525u + 1013904223u;
+            p[i] = static_cast<unsigned char>((state >> 24) % static_cast<uint32_t>(limit));
+        }
+    }
+    return img;
+}
+
+// Same size, depth and pixel bytes (row padding ignored).
+inline bool samePixels(const CImage& a, const CImage& b) {
+    if (a.GetWidth() != b.GetWidth() || a.GetHeight() != b.GetHeight() || a.GetBitCount() != b.GetBitCount())
+        return false;
+    const size_t rowBytes = static_cast<size_t>(a.GetWidth()) * (a.GetBitCount() / 8);
+    for (int y = 0; y < a.GetHeight(); ++y)
+        if (std::memcmp(a.GetPtrXY(0, y), b.GetPtrXY(0, y), rowBytes) != 0) return false;
+    return true;
+}
+
+// Collects trace lines while alive.
+class TraceCapture {
+public:
+    TraceCapture() { lines().clear(); m_previous = SetTraceHandler(&TraceCapture::record); }
+    ~TraceCapture() { SetTraceHandler(m_previous); }
+    bool saw(const std::wstring& line) const {
+        for (const auto& l : lines())
+            if (l == line) return true;
+        return false;
+    }
+
+private:
+    static std::vector<std::wstring>& lines() {
+        static std::vector<std::wstring> all;
+        return all;
+    }
+    static void record(const wchar_t* line) { lines().emplace_back(line); }
+    TraceHandler m_previous;
+};
+
+}  // namespace geometry_test
