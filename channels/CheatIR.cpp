@@ -56,14 +56,20 @@ constexpr int kCandidateContrast = 20;
 constexpr int kMaxPlane1 = 150;
 constexpr int kMaxPlane0 = 149;
 
-bool IsDarkFeature(const CImage& plane0, const CImage& plane1, int x, int y) {
+// Marks the row's candidates (a pixel 5 away, left, right, above or below, brighter by more
+// than 20) that are dark in both planes.
+void MarkDarkFeatures(const CImage& plane0, const CImage& plane1, int y, uint8_t* mask) {
     const uint8_t* row = plane0.GetPtrXY(0, y);
-    const int p = row[x];
-    const int brighter = p + kCandidateContrast;
-    const bool candidate = row[x - kBorder] > brighter || row[x + kBorder] > brighter ||
-                           plane0.GetPtrXY(0, y - kBorder)[x] > brighter ||
-                           plane0.GetPtrXY(0, y + kBorder)[x] > brighter;
-    return candidate && plane1.GetPtrXY(0, y)[x] <= kMaxPlane1 && p <= kMaxPlane0;
+    const uint8_t* above = plane0.GetPtrXY(0, y - kBorder);
+    const uint8_t* below = plane0.GetPtrXY(0, y + kBorder);
+    const uint8_t* row1 = plane1.GetPtrXY(0, y);
+    for (int x = kBorder; x < plane0.GetWidth() - kBorder; ++x) {
+        const int p = row[x];
+        const int brighter = p + kCandidateContrast;
+        const bool candidate =
+            row[x - kBorder] > brighter || row[x + kBorder] > brighter || above[x] > brighter || below[x] > brighter;
+        mask[x] = candidate && row1[x] <= kMaxPlane1 && p <= kMaxPlane0 ? 255 : 0;
+    }
 }
 
 // The table's response on plane 1 around (x, y), scaled by the positive weights and kept
@@ -112,11 +118,8 @@ bool CCheatIR::CheatCreate(const CImage* planes) {
 
     // The whole mask first, then the darkening, so the 81-term sum runs on marked pixels only.
     std::vector<uint8_t> mask(static_cast<size_t>(width > 0 ? width : 0) * (height > 0 ? height : 0), 0);
-    for (int y = kBorder; y < height - kBorder; ++y) {
-        for (int x = kBorder; x < width - kBorder; ++x) {
-            if (IsDarkFeature(plane0, plane1, x, y)) mask[static_cast<size_t>(y) * width + x] = 255;
-        }
-    }
+    for (int y = kBorder; y < height - kBorder; ++y)
+        MarkDarkFeatures(plane0, plane1, y, mask.data() + static_cast<size_t>(y) * width);
 
     m_cheat = plane0;  // the border and every unmarked pixel keep plane 0's value
     const uint8_t* plane1Rows[kLogSize];
