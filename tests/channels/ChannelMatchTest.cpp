@@ -134,6 +134,29 @@ TEST(ChannelMatchAndWarp, WritesNothingWithoutSegmentsAndWhiteForPointlessOnes) 
         for (int i = 0; i < 21 * picture.GetBitCount() / 8; ++i) ASSERT_EQ(picture.GetPtrXY(0, y)[i], 255);
 }
 
+TEST(ChannelMatchAndWarp, DumpsTheLastPointsMapsAndTheSegmentsSum) {
+    DumpDir dumps("varnoth_channels_point");
+    CCheatIR cheat;
+    CImage channel = Noise(60, 60, 4);
+    const CImage reference = channel;
+    Access::Segments(cheat).push_back(SSegment{RECT{20, 20, 40, 40}, {CPoint(30, 30)}});
+    EXPECT_TRUE(Access::ChannelMatchAndWarp(cheat, channel, reference));
+    EXPECT_TRUE(SamePixels(channel, reference));
+    CImage local, base, sum;
+    ASSERT_TRUE(local.ImportFile(dumps.File("localMap.bmp").string()));
+    ASSERT_TRUE(base.ImportFile(dumps.File("baseMap.bmp").string()));
+    ASSERT_TRUE(sum.ImportFile(dumps.File("acumMap.bmp").string()));
+    EXPECT_EQ(At(local, 10, 10), 0);  // offset (0, 0) matches exactly
+    EXPECT_GT(At(local, 0, 0), 0);
+    for (int i = 0; i < 5; ++i)
+        for (int j = 0; j < 5; ++j) EXPECT_EQ(At(base, j, i), At(reference, 28 + j, 28 + i));
+    EXPECT_EQ(At(sum, 10, 10), 0);
+    int brightest = 0;
+    for (int y = 0; y < 21; ++y)
+        for (int x = 0; x < 21; ++x) brightest = std::max<int>(brightest, At(sum, x, y));
+    EXPECT_EQ(brightest, 255);  // the largest sum scales to 255
+}
+
 // Strokes of several directions, so that every offset but the true one grades worse, on a
 // slightly noisy paper: a flat window would grade 0 (a perfect match) at any offset.
 CImage StrokePage(int w, int h) {

@@ -153,10 +153,26 @@ TEST(SegmentsFind, RingBecomesOneSegmentWithOutlinePoints) {
     // they are never labelled.
     Fill(src, 70, 0, 72, 79, 30);
     Fill(src, 0, 70, 79, 72, 30);
+    const std::filesystem::path dir = std::filesystem::temp_directory_path() / "varnoth_channels_ring";
+    setenv("VARNOTH_DUMP_DIR", dir.c_str(), 1);
     CCheatIR cheat;
     CCheatIRTestAccess::SegmentsFind(cheat, src);
+    unsetenv("VARNOTH_DUMP_DIR");
     const std::deque<SSegment>& segments = CCheatIRTestAccess::Segments(cheat);
     ASSERT_EQ(segments.size(), 1u);
+    // The picture: white paper, the group's label 0 times 240 / n, the box in red.
+    CImage picture;
+    ASSERT_TRUE(picture.ImportFile((dir / "results" / "groups.bmp").string()));
+    std::filesystem::remove_all(dir);
+    ASSERT_EQ(picture.GetBitCount(), 24);  // the red palette entry makes it colour
+    auto bgr = [&](int x, int y) {
+        const uint8_t* p = picture.GetPtrXY(x, y);
+        return (p[0] << 16) | (p[1] << 8) | p[2];
+    };
+    EXPECT_EQ(bgr(5, 5), 0xFFFFFF);
+    EXPECT_EQ(bgr(40, 20), 0x0000FF);
+    EXPECT_EQ(bgr(59, 40), 0x0000FF);
+    EXPECT_EQ(bgr(22, 40), 0x000000);
     const RECT& r = segments[0].rect;
     EXPECT_EQ(r, (RECT{20, 20, 59, 59}));
     EXPECT_EQ(segments[0].points.front(), CPoint(24, 20));  // sx = 39 / 8 = 4
