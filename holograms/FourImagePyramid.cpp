@@ -2,6 +2,7 @@
 // result is chosen or synthesised from the four candidates by brightness (of the Gaussian
 // level), saturation and detail strength (of the Laplacian level).
 #include <cstdint>
+#include <utility>
 
 #include "holograms/FourImageInternal.h"
 #include "holograms/FourImagePyramidInternal.h"
@@ -32,7 +33,8 @@ void BuildCandidatePyramids(const CImage* const images[4], CPyramid laplacian[4]
 
 void CollapseInto(CPyramid& result, CImage& out) {
     result.ReconstructGaussian();
-    out = result.GetLevel(0);
+    // The pyramid is discarded afterwards: hand its level 0 over instead of copying it.
+    out = std::move(result.GetLevel(0));
 }
 
 void ForEachRowBand(int height, const std::function<void(int, int)>& body) {
@@ -64,8 +66,6 @@ void ComposePixel(const unsigned char* const detail[4], const int bright[4], uns
     int least = -1, second = -1;
     int leastBright = 1000, secondBright = 1000;
     int peak[4] = {0, 0, 0, 0};
-    float neutrality = 0.0f;
-    float coefficient[3] = {1.0f, 1.0f, 1.0f};  // grey when no unsaturated detail has all channels
     int largestPeak = -1, largestCandidate = -1, smallestPeak = 1000;
     int unsaturated = -1;
 
@@ -76,7 +76,7 @@ void ComposePixel(const unsigned char* const detail[4], const int bright[4], uns
             continue;
         }
         unsaturated = i;
-        if (bright[i] <= leastBright) {
+        if (bright[i] <= leastBright) {  // on ties the later candidate becomes the least
             second = least;
             secondBright = leastBright;
             least = i;
@@ -85,13 +85,7 @@ void ComposePixel(const unsigned char* const detail[4], const int bright[4], uns
             second = i;
             secondBright = bright[i];
         }
-        const unsigned char* p = detail[i];
-        peak[i] = MaxChannel(p);
-        const float ratio = peak[i] == 0 ? 0.0f : static_cast<float>(MinChannel(p)) / static_cast<float>(peak[i]);
-        if (ratio > neutrality) {
-            neutrality = ratio;
-            for (int c = 0; c < 3; ++c) coefficient[c] = static_cast<float>(p[c]) / static_cast<float>(peak[i]);
-        }
+        peak[i] = MaxChannel(detail[i]);
         if (peak[i] > largestPeak) {
             largestPeak = peak[i];
             largestCandidate = i;
@@ -101,20 +95,36 @@ void ComposePixel(const unsigned char* const detail[4], const int bright[4], uns
 
     if (saturatedCount == 4) {
         CopyPixel(out, detail[darkestSaturated]);
-    } else if (saturatedCount == 3) {
-        CopyPixel(out, detail[unsaturated]);
-    } else if (saturatedCount == 0 && largestPeak - smallestPeak < kPeakSpread) {
-        CopyPixel(out, detail[largestCandidate]);
-    } else {
-        // At least two candidates are unsaturated here, so both least and second exist.
-        const bool secondIsFlatter = peak[second] < peak[least];
-        const int p = secondIsFlatter ? second : least;
-        const int q = secondIsFlatter ? least : second;
-        int v = peak[p];
-        if (v > 127 && peak[q] - v < kPeakSpread) v = peak[q];
-        for (int c = 0; c < 3; ++c)
-            out[c] = static_cast<unsigned char>(static_cast<int>(static_cast<float>(v) * coefficient[c]));
+        return;
     }
+    if (saturatedCount == 3) {
+        CopyPixel(out, detail[unsaturated]);
+        return;
+    }
+    if (saturatedCount == 0 && largestPeak - smallestPeak < kPeakSpread) {
+        CopyPixel(out, detail[largestCandidate]);
+        return;
+    }
+    // Synthesis. The colour comes from the most neutral unsaturated detail (the earliest on
+    // ties); with none above 0 the coefficients stay 1 and the pixel is the grey value v.
+    float neutrality = 0.0f;
+    float coefficient[3] = {1.0f, 1.0f, 1.0f};
+    for (int i = 0; i < 4; ++i) {
+        if (bright[i] >= kSaturatedBrightness || peak[i] == 0) continue;
+        const float ratio = static_cast<float>(MinChannel(detail[i])) / static_cast<float>(peak[i]);
+        if (ratio > neutrality) {
+            neutrality = ratio;
+            for (int c = 0; c < 3; ++c) coefficient[c] = static_cast<float>(detail[i][c]) / static_cast<float>(peak[i]);
+        }
+    }
+    // At least two candidates are unsaturated here, so both least and second exist.
+    const bool secondIsFlatter = peak[second] < peak[least];
+    const int p = secondIsFlatter ? second : least;
+    const int q = secondIsFlatter ? least : second;
+    int v = peak[p];
+    if (v > 127 && peak[q] - v < kPeakSpread) v = peak[q];
+    for (int c = 0; c < 3; ++c)
+        out[c] = static_cast<unsigned char>(static_cast<int>(static_cast<float>(v) * coefficient[c]));
 }
 
 // HologramsRemove4Img3: the flattest detail among candidates below 250; top if none.

@@ -15,7 +15,8 @@ constexpr int kBrightLimit3 = 250;         // HologramsRemove4Img3 takes candida
 // Seven-level Laplacian pyramid of each image with the Gaussian levels it was built from.
 void BuildCandidatePyramids(const CImage* const images[4], CPyramid laplacian[4], CPyramid gaussian[4]);
 
-// Collapses a Laplacian result pyramid and assigns its level 0 to `out`.
+// Collapses a Laplacian result pyramid and moves its level 0 into `out`; the pyramid is
+// not to be used afterwards.
 void CollapseInto(CPyramid& result, CImage& out);
 
 // Splits [0, height) into row bands over the worker threads; returns when all are done.
