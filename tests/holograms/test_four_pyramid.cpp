@@ -61,6 +61,10 @@ TEST(FourImagePyramid, PeakSpreadSixCopiesSevenSynthesises) {
     const int bright[4] = {100, 50, 60, 200};  // least bright: candidate 1, second: candidate 2
     const Bgr close[4] = {{20, 100, 128}, {64, 96, 130}, {30, 90, 134}, {10, 50, 129}};
     EXPECT_EQ(Composed(close, bright), close[2]);  // largest peak, 134 - 128 = 6
+    // Spread 7 is synthesised: P = candidate 1 (peak 128), Q's 135 is not within 7 of it,
+    // colour of candidate 1 (the most neutral); copying the largest would give candidate 2.
+    const Bgr seven[4] = {{10, 50, 130}, {64, 96, 128}, {30, 90, 135}, {10, 50, 129}};
+    EXPECT_EQ(Composed(seven, bright), (Bgr{64, 96, 128}));
     // Spread 22: P = candidate 1 (peak 128), colour from the most neutral (candidate 1).
     const Bgr spread[4] = {{20, 100, 130}, {64, 96, 128}, {30, 90, 140}, {10, 50, 150}};
     EXPECT_EQ(Composed(spread, bright), (Bgr{64, 96, 128}));
