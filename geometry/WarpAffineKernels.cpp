@@ -9,6 +9,8 @@
 #include <hwy/foreach_target.h>  // IWYU pragma: keep
 #include <hwy/highway.h>
 
+#include "geometry/PixelPairs-inl.h"
+
 #include <algorithm>
 #include <cstring>
 
@@ -73,64 +75,11 @@ HWY_INLINE void sampleScalar(const AffineSource& s, uint8_t* out, int count, uin
 }
 
 #if HWY_TARGET != HWY_SCALAR
-// One-lane targets take the scalar rule for every pixel.
-using D32 = hn::ScalableTag<int32_t>;
-using V32 = hn::Vec<D32>;
-using M32 = hn::Mask<D32>;
-constexpr size_t kMaxLanes = HWY_MAX_BYTES / sizeof(int32_t);
-
-HWY_INLINE V32 byteOf(V32 word, int index) {
-    const D32 d;
-    return hn::And(hn::ShiftRightSame(word, 8 * index), hn::Set(d, 0xFF));
-}
-
 // min(254, (s00·w00 + s10·w10 + s01·w01 + s11·w11) >> 16) per lane.
-HWY_INLINE V32 blend(V32 s00, V32 s10, V32 s01, V32 s11, V32 w00, V32 w10, V32 w01, V32 w11) {
+HWY_INLINE V32 blend(const ChannelQuad& s, V32 w00, V32 w10, V32 w01, V32 w11) {
     const D32 d;
-    const V32 sum = hn::Add(hn::Add(hn::Mul(s00, w00), hn::Mul(s10, w10)), hn::Add(hn::Mul(s01, w01), hn::Mul(s11, w11)));
+    const V32 sum = hn::Add(hn::Add(hn::Mul(s.s00, w00), hn::Mul(s.s10, w10)), hn::Add(hn::Mul(s.s01, w01), hn::Mul(s.s11, w11)));
     return hn::Min(hn::ShiftRight<16>(sum), hn::Set(d, 254));
-}
-
-// Writes the B, G, R bytes of each lane (its low three bytes) to consecutive pixels: every
-// 128-bit block is packed to 12 bytes in the register, then copied.
-HWY_INLINE void storeColourPixels(V32 pixels, uint8_t* out) {
-    const D32 d;
-    const hn::Repartition<uint8_t, D32> d8;
-    alignas(16) static constexpr uint8_t kPack[16] = {0, 1, 2, 4, 5, 6, 8, 9, 10, 12, 13, 14, 15, 15, 15, 15};
-    HWY_ALIGN uint8_t packed[HWY_MAX_BYTES];
-    const auto bytes = hn::BitCast(d8, pixels);
-    hn::Store(hn::TableLookupBytes(bytes, hn::LoadDup128(d8, kPack)), d8, packed);
-    const int blocks = static_cast<int>(hn::Lanes(d)) / 4;
-    for (int block = 0; block < blocks; ++block) std::memcpy(out + 12 * block, packed + 16 * block, 12);
-}
-
-// Reads, for every lane, the pixel at `at` and its right neighbour: colour lanes as the eight
-// bytes ending at the neighbour (two bytes of pixel sx - 1, then B G R B G R) split into a
-// low and a high word; grey lanes as one word holding the two bytes. Gathers are slow on the
-// machines we measured, so each lane is one scalar load.
-template <int BPP>
-HWY_INLINE void loadNeighbourPairs(const uint8_t* bits, V32 at, V32& low, V32& high) {
-    const D32 d;
-    HWY_ALIGN int32_t offsets[kMaxLanes], lows[kMaxLanes], highs[kMaxLanes];
-    const int lanes = static_cast<int>(hn::Lanes(d));
-    if constexpr (BPP == 3) {
-        hn::Store(hn::Sub(at, hn::Set(d, 2)), d, offsets);
-        for (int j = 0; j < lanes; ++j) {
-            uint64_t pair;
-            std::memcpy(&pair, bits + offsets[j], 8);
-            lows[j] = static_cast<int32_t>(static_cast<uint32_t>(pair));
-            highs[j] = static_cast<int32_t>(static_cast<uint32_t>(pair >> 32));
-        }
-        high = hn::Load(d, highs);
-    } else {
-        hn::Store(at, d, offsets);
-        for (int j = 0; j < lanes; ++j) {
-            uint16_t pair;
-            std::memcpy(&pair, bits + offsets[j], 2);
-            lows[j] = pair;
-        }
-    }
-    low = hn::Load(d, lows);
 }
 
 // Bilinear bytes of every lane, packed B | G << 8 | R << 16 (grey in the low byte). Lanes
@@ -153,14 +102,12 @@ HWY_INLINE V32 sampleLanes(const AffineSource& s, V32 vx, V32 vy, M32 usable) {
     V32 low00, high00, low01, high01;
     loadNeighbourPairs<BPP>(s.bits, at00, low00, high00);
     loadNeighbourPairs<BPP>(s.bits, at01, low01, high01);
-    if constexpr (BPP == 3) {
-        const V32 blue = blend(byteOf(low00, 2), byteOf(high00, 1), byteOf(low01, 2), byteOf(high01, 1), w00, w10, w01, w11);
-        const V32 green = blend(byteOf(low00, 3), byteOf(high00, 2), byteOf(low01, 3), byteOf(high01, 2), w00, w10, w01, w11);
-        const V32 red = blend(byteOf(high00, 0), byteOf(high00, 3), byteOf(high01, 0), byteOf(high01, 3), w00, w10, w01, w11);
-        return hn::Or(hn::Or(blue, hn::ShiftLeft<8>(green)), hn::ShiftLeft<16>(red));
-    } else {
-        return blend(byteOf(low00, 0), byteOf(low00, 1), byteOf(low01, 0), byteOf(low01, 1), w00, w10, w01, w11);
+    V32 result = hn::Zero(d);
+    for (int c = 0; c < BPP; ++c) {
+        const V32 channel = blend(channelOf<BPP>(low00, high00, low01, high01, c), w00, w10, w01, w11);
+        result = hn::Or(result, hn::ShiftLeftSame(channel, 8 * c));
     }
+    return result;
 }
 
 // A group of pixels whose lanes are not all usable: usable lanes from the vector result,
@@ -213,14 +160,10 @@ void sampleRow(const AffineSource& s, const AffineRow& row) {
                 continue;
             }
             const V32 result = sampleLanes<BPP>(s, vx, vy, usable);
-            if (!hn::AllTrue(d, usable)) {
+            if (hn::AllTrue(d, usable))
+                storePixels<BPP>(result, out);
+            else
                 storeMixedGroup<BPP>(s, result, usable, out, X, Y, row.stepX, row.stepY);
-            } else if constexpr (BPP == 3) {
-                storeColourPixels(result, out);
-            } else {
-                const hn::Rebind<uint8_t, D32> d8;
-                hn::StoreU(hn::DemoteTo(d8, result), d8, out);
-            }
         }
     }
 #endif
