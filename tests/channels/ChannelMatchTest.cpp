@@ -157,6 +157,18 @@ TEST(ChannelMatchAndWarp, DumpsTheLastPointsMapsAndTheSegmentsSum) {
     EXPECT_EQ(brightest, 255);  // the largest sum scales to 255
 }
 
+TEST(MatchChannels, TinyPlanesGiveNoSegments) {
+    for (auto [w, h] : {std::pair{1, 1}, std::pair{4, 3}, std::pair{12, 2}, std::pair{0, 0}}) {
+        CImage planes[3];
+        for (CImage& plane : planes) plane.Reallocate(w, h, 8);  // 0 x 0 is an empty 8-bit image
+        CCheatIR cheat;
+        std::vector<SSegmentGrades> grades(3);
+        EXPECT_TRUE(cheat.MatchChannels(planes, &grades)) << w << "x" << h;
+        EXPECT_TRUE(grades.empty());
+        EXPECT_TRUE(cheat.CheatCreate(planes));
+    }
+}
+
 // Strokes of several directions, so that every offset but the true one grades worse, on a
 // slightly noisy paper: a flat window would grade 0 (a perfect match) at any offset.
 CImage StrokePage(int w, int h) {
