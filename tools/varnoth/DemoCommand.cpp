@@ -12,6 +12,7 @@
 #include "varnoth/Commands.h"
 #include "varnoth/FourImageMethods.h"
 #include "varnoth/ToolIO.h"
+#include "varnoth/TwoImageMethods.h"
 
 namespace {
 
@@ -128,6 +129,8 @@ void RunDemo(const DemoArgs& args) {
     std::printf("\nWrote the shots, the truth and every result to %s\n", args.outDir.c_str());
     std::printf("%s: the four shots | the best result (%s) | the truth\n", montage.c_str(),
                 outcomes.front().name.c_str());
+
+    RunTwoImageDemo(dir, w, h, args.seed);
 }
 
 }  // namespace
