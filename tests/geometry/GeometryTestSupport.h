@@ -1,7 +1,10 @@
 #pragma once
 
+#include <hwy/targets.h>
+
 #include <cstdint>
 #include <cstring>
+#include <functional>
 #include <string>
 #include <vector>
 
@@ -32,6 +35,16 @@ inline bool samePixels(const CImage& a, const CImage& b) {
     for (int y = 0; y < a.GetHeight(); ++y)
         if (std::memcmp(a.GetPtrXY(0, y), b.GetPtrXY(0, y), rowBytes) != 0) return false;
     return true;
+}
+
+// Runs `body` once with each vector target this machine supports forced, then restores the
+// normal choice, so the dispatched kernels are checked on every instruction set they use here.
+inline void forEachVectorTarget(const std::function<void(const char* target)>& body) {
+    for (int64_t target : hwy::SupportedAndGeneratedTargets()) {
+        hwy::SetSupportedTargetsForTest(target);
+        body(hwy::TargetName(target));
+    }
+    hwy::SetSupportedTargetsForTest(0);
 }
 
 // Collects trace lines while alive.

@@ -123,27 +123,30 @@ TEST(WarpAffine, FastPathMatchesPlainDefinition) {
         {{-1, 0, 40, 0, 1, 0.5f}, false, {0, 0}},
         {{30000, 0, 0, 0, 30000, 0}, false, {0, 0}},  // 16.16 positions wrap
     };
-    for (int bits : {8, 24}) {
-        for (int size : {37, 64}) {
-            for (const Case& c : cases) {
-                for (int threads : {1, 2}) {
-                    imagelib::SetThreadLimit(threads);
-                    const CImage src = noiseImage(size, size + 3, bits, static_cast<uint32_t>(size + bits));
-                    CImage plain = noiseImage(size + 5, size - 4, bits, 5), fast(plain);
-                    CPoint plainCorners[4], fastCorners[4];
-                    const bool a = geometry::warpAffineWith(c.m, src, plain, c.fit, &c.shift, plainCorners,
-                                                            geometry::Kernel::Plain);
-                    const bool b = WarpAffine(c.m, src, fast, c.fit, &c.shift, fastCorners);
-                    ASSERT_EQ(a, b);
-                    ASSERT_TRUE(samePixels(plain, fast)) << bits << " bits, size " << size << ", map " << c.m[0];
-                    if (c.fit) {
-                        ASSERT_TRUE(std::equal(plainCorners, plainCorners + 4, fastCorners));
+    geometry_test::forEachVectorTarget([&](const char* target) {
+        for (int bits : {8, 24}) {
+            for (int size : {37, 64}) {
+                for (const Case& c : cases) {
+                    for (int threads : {1, 2}) {
+                        imagelib::SetThreadLimit(threads);
+                        const CImage src = noiseImage(size, size + 3, bits, static_cast<uint32_t>(size + bits));
+                        CImage plain = noiseImage(size + 5, size - 4, bits, 5), fast(plain);
+                        CPoint plainCorners[4], fastCorners[4];
+                        const bool a = geometry::warpAffineWith(c.m, src, plain, c.fit, &c.shift, plainCorners,
+                                                                geometry::Kernel::Plain);
+                        const bool b = WarpAffine(c.m, src, fast, c.fit, &c.shift, fastCorners);
+                        imagelib::SetThreadLimit(0);
+                        ASSERT_EQ(a, b);
+                        ASSERT_TRUE(samePixels(plain, fast))
+                            << target << ", " << bits << " bits, size " << size << ", map " << c.m[0];
+                        if (c.fit) {
+                            ASSERT_TRUE(std::equal(plainCorners, plainCorners + 4, fastCorners));
+                        }
                     }
-                    imagelib::SetThreadLimit(0);
                 }
             }
         }
-    }
+    });
 }
 
 TEST(WarpAffine, SourceMayBeTheDestination) {

@@ -86,19 +86,23 @@ TEST(WarpRadialAndScale, FastPathMatchesPlainDefinition) {
         {-0.3f, 0.1f, 0, -0.4f, 0.25f},
         {60, -40, 25, 3, -2},  // products overflow 32 bits
     };
-    for (int bits : {8, 24})
-        for (const auto& p : cases)
-            for (int threads : {1, 2}) {
-                imagelib::SetThreadLimit(threads);
-                const CImage src = noiseImage(33, 21, bits, 6);
-                CImage plain(45, 30, bits), fast(45, 30, bits);
-                ASSERT_TRUE(geometry::warpRadialAndScaleWith(p, src, plain, geometry::Kernel::Plain));
-                ASSERT_TRUE(WarpRadialAndScale(p, src, fast));
-                EXPECT_TRUE(samePixels(plain, fast)) << bits << " bits, k1 " << p[0];
-                CImage same(src), expected(src.GetWidth(), src.GetHeight(), bits);
-                ASSERT_TRUE(WarpRadialAndScale(p, src, expected));
-                ASSERT_TRUE(WarpRadialAndScale(p, same, same));
-                EXPECT_TRUE(samePixels(same, expected));
-                imagelib::SetThreadLimit(0);
+    geometry_test::forEachVectorTarget([&](const char* target) {
+        for (int bits : {8, 24}) {
+            for (const auto& p : cases) {
+                for (int threads : {1, 2}) {
+                    imagelib::SetThreadLimit(threads);
+                    const CImage src = noiseImage(33, 21, bits, 6);
+                    CImage plain(45, 30, bits), fast(45, 30, bits);
+                    ASSERT_TRUE(geometry::warpRadialAndScaleWith(p, src, plain, geometry::Kernel::Plain));
+                    ASSERT_TRUE(WarpRadialAndScale(p, src, fast));
+                    EXPECT_TRUE(samePixels(plain, fast)) << target << ", " << bits << " bits, k1 " << p[0];
+                    CImage same(src), expected(src.GetWidth(), src.GetHeight(), bits);
+                    ASSERT_TRUE(WarpRadialAndScale(p, src, expected));
+                    ASSERT_TRUE(WarpRadialAndScale(p, same, same));
+                    EXPECT_TRUE(samePixels(same, expected));
+                    imagelib::SetThreadLimit(0);
+                }
             }
+        }
+    });
 }
