@@ -92,27 +92,43 @@ void ReduceRowGrey(const uint16_t* v, [[maybe_unused]] int sw, int dw, uint8_t* 
     }
 }
 
-// Colour interior outputs: the filter is run at every byte position 6 .. 6(dw-2)+2 of the
-// row into `full`, and every second pixel is then kept.
-void ReduceRowColour(const uint16_t* v, int sw, int dw, uint8_t* full, uint8_t* out) {
+// Splits an interleaved colour row of sw pixels into B, G and R planes `stride` apart.
+void SplitPlanes(const uint16_t* v, int sw, size_t stride, uint16_t* planes) {
     const D16 d;
-    const hn::Rebind<uint8_t, D16> d8;
+    uint16_t* plane[3] = {planes, planes + stride, planes + 2 * stride};
     const int lanes = static_cast<int>(hn::Lanes(d));
-    const int n = 3 * sw, last = 6 * (dw - 2) + 2;
-    const auto six = hn::Set(d, 6);
-    int e = 6;
-    for (; e + lanes + 6 <= n && e <= last; e += lanes) {
-        const auto outer = hn::Add(hn::LoadU(d, v + e - 6), hn::LoadU(d, v + e + 6));
-        const auto inner = hn::Add(hn::LoadU(d, v + e - 3), hn::LoadU(d, v + e + 3));
-        const auto sum = hn::Add(hn::Add(outer, hn::ShiftLeft<2>(inner)), hn::Mul(hn::LoadU(d, v + e), six));
-        hn::StoreU(NarrowToBytes(hn::ShiftRight<8>(sum)), d8, full + e);
+    int i = 0;
+    for (; i + lanes <= sw; i += lanes) {
+        hn::Vec<D16> b, g, r;
+        hn::LoadInterleaved3(d, v + 3 * i, b, g, r);
+        hn::StoreU(b, d, plane[0] + i);
+        hn::StoreU(g, d, plane[1] + i);
+        hn::StoreU(r, d, plane[2] + i);
     }
-    for (; e <= last; ++e)
-        full[e] = static_cast<uint8_t>((v[e - 6] + 4 * v[e - 3] + 6 * v[e] + 4 * v[e + 3] + v[e + 6]) >> 8);
-    // Four-byte moves; the fourth byte lands on the next pixel, which is written after it.
-    int j = 1;
-    for (; j < dw - 2; ++j) std::memcpy(out + 3 * j, full + 6 * j, 4);
-    if (j == dw - 2) std::memcpy(out + 3 * j, full + 6 * j, 3);
+    for (; i < sw; ++i)
+        for (int c = 0; c < 3; ++c) plane[c][i] = v[3 * i + c];
+}
+
+// Joins pixels first .. last (inclusive) of three byte planes `stride` apart into B, G, R.
+void JoinPlanes(const uint8_t* planeBytes, size_t stride, int first, int last, uint8_t* out) {
+    const hn::ScalableTag<uint8_t> d8;
+    const uint8_t* bytes[3] = {planeBytes, planeBytes + stride, planeBytes + 2 * stride};
+    const int lanes = static_cast<int>(hn::Lanes(d8));
+    int x = first;
+    for (; x + lanes <= last + 1; x += lanes) {
+        hn::StoreInterleaved3(hn::LoadU(d8, bytes[0] + x), hn::LoadU(d8, bytes[1] + x), hn::LoadU(d8, bytes[2] + x), d8,
+                              out + 3 * x);
+    }
+    for (; x <= last; ++x)
+        for (int c = 0; c < 3; ++c) out[3 * x + c] = bytes[c][x];
+}
+
+// Colour interior outputs 1 .. dw-2: each plane is reduced as a grey row.
+void ReduceRowColour(const uint16_t* v, int sw, int dw, size_t stride, uint16_t* planes, uint8_t* planeBytes,
+                     uint8_t* out) {
+    SplitPlanes(v, sw, stride, planes);
+    for (int c = 0; c < 3; ++c) ReduceRowGrey(planes + c * stride, sw, dw, planeBytes + 2 * c * stride);
+    JoinPlanes(planeBytes, 2 * stride, 1, dw - 2, out);
 }
 
 // Grey interior positions 2 .. 2sw-3: even ones on a source pixel, odd ones between two.
@@ -136,30 +152,11 @@ void ExpandRowGrey(const uint16_t* v, int sw, uint8_t* out) {
     }
 }
 
-// Colour interior positions: the on-pixel and between-pixel values of every source byte go
-// to `on` and `between`, then pixels are interleaved into the row.
-void ExpandRowColour(const uint16_t* v, int sw, uint8_t* on, uint8_t* between, uint8_t* out) {
-    const D16 d;
-    const hn::Rebind<uint8_t, D16> d8;
-    const int lanes = static_cast<int>(hn::Lanes(d));
-    const int n = 3 * sw, last = 3 * sw - 4;
-    const auto six = hn::Set(d, 6);
-    int e = 3;
-    for (; e + lanes + 3 <= n && e <= last; e += lanes) {
-        const auto left = hn::LoadU(d, v + e - 3), centre = hn::LoadU(d, v + e), right = hn::LoadU(d, v + e + 3);
-        hn::StoreU(NarrowToBytes(hn::ShiftRight<6>(hn::Add(hn::Add(left, right), hn::Mul(centre, six)))), d8, on + e);
-        hn::StoreU(NarrowToBytes(hn::ShiftRight<4>(hn::Add(centre, right))), d8, between + e);
-    }
-    for (; e <= last; ++e) {
-        on[e] = static_cast<uint8_t>((v[e - 3] + 6 * v[e] + v[e + 3]) >> 6);
-        between[e] = static_cast<uint8_t>((4 * (v[e] + v[e + 3])) >> 6);
-    }
-    // Four-byte moves in ascending order; each spare byte is overwritten by the next move,
-    // the last one by the border pixels written afterwards.
-    for (int i = 1; i <= sw - 2; ++i) {
-        std::memcpy(out + 6 * i, on + 3 * i, 4);
-        std::memcpy(out + 6 * i + 3, between + 3 * i, 4);
-    }
+// Colour interior positions 2 .. 2sw-3: each plane is expanded as a grey row.
+void ExpandRowColour(const uint16_t* v, int sw, size_t stride, uint16_t* planes, uint8_t* planeBytes, uint8_t* out) {
+    SplitPlanes(v, sw, stride, planes);
+    for (int c = 0; c < 3; ++c) ExpandRowGrey(planes + c * stride, sw, planeBytes + 2 * c * stride);
+    JoinPlanes(planeBytes, 2 * stride, 2, 2 * sw - 3, out);
 }
 
 }  // namespace HWY_NAMESPACE
@@ -210,12 +207,14 @@ void FastReduce(const CImage& src, CImage& dst, int16_t* work, size_t capacity) 
     const size_t n = static_cast<size_t>(sw) * ch, sspan = src.GetSpan(), dspan = dst.GetSpan();
     const uint8_t* srcBits = src.GetBits();
     uint8_t* dstBits = dst.GetBits();
-    // Vertical sums, then (colour) the byte row of the filter at every position.
-    const size_t slice = AlignUp(n) + AlignUp(n / 2 + 8);
+    // Vertical sums, then (colour) three planes of sums and three planes of reduced bytes.
+    const size_t stride = AlignUp(static_cast<size_t>(sw) + 8);
+    const size_t slice = AlignUp(n) + 6 * stride;
 
     auto reduceRows = [&](int begin, int end, int16_t* scratch) {
         uint16_t* sum = reinterpret_cast<uint16_t*>(scratch);
-        uint8_t* full = reinterpret_cast<uint8_t*>(scratch + AlignUp(n));
+        uint16_t* planes = reinterpret_cast<uint16_t*>(scratch + AlignUp(n));
+        uint8_t* planeBytes = reinterpret_cast<uint8_t*>(scratch + AlignUp(n) + 3 * stride);
         auto row = [&](int m) { return srcBits + static_cast<size_t>(m) * sspan; };
         for (int r = begin; r < end; ++r) {
             // Rows in memory order; the first and last destination rows mirror about the
@@ -232,7 +231,7 @@ void FastReduce(const CImage& src, CImage& dst, int16_t* work, size_t capacity) 
             if (ch == 1) {
                 HWY_DYNAMIC_DISPATCH(ReduceRowGrey)(sum, sw, dw, out);
             } else {
-                HWY_DYNAMIC_DISPATCH(ReduceRowColour)(sum, sw, dw, full, out);
+                HWY_DYNAMIC_DISPATCH(ReduceRowColour)(sum, sw, dw, stride, planes, planeBytes, out);
             }
             for (int c = 0; c < ch; ++c) {
                 auto v = [&](int i) { return static_cast<int>(sum[i * ch + c]); };
@@ -256,17 +255,17 @@ int ExpandEdge(const uint16_t* sum, int ch, int c, int sw, int dw, int x) {
     return 2 * (3 * v(0) + v(1));
 }
 
-// Scratch of one band of expanded rows: vertical sums, then (colour) the on-pixel and
-// between-pixel byte rows, then (when combining) the expanded row itself.
+// Scratch of one band of expanded rows: vertical sums, (colour) three planes of sums and three
+// planes of expanded bytes, then (when combining) the expanded row itself.
 struct ExpandScratch {
-    ExpandScratch(size_t n, size_t rowBytes)
-        : sumSize(AlignUp(n)), bytesSize(AlignUp(n / 2 + 8)), rowSize(AlignUp(rowBytes / 2 + 8)) {}
-    size_t Slice(bool withRow) const { return sumSize + 2 * bytesSize + (withRow ? rowSize : 0); }
+    ExpandScratch(size_t sw, size_t n, size_t rowBytes)
+        : sumSize(AlignUp(n)), stride(AlignUp(sw + 8)), rowSize(AlignUp(rowBytes / 2 + 8)) {}
+    size_t Slice(bool withRow) const { return sumSize + 6 * stride + (withRow ? rowSize : 0); }
     uint16_t* Sum(int16_t* s) const { return reinterpret_cast<uint16_t*>(s); }
-    uint8_t* On(int16_t* s) const { return reinterpret_cast<uint8_t*>(s + sumSize); }
-    uint8_t* Between(int16_t* s) const { return reinterpret_cast<uint8_t*>(s + sumSize + bytesSize); }
-    uint8_t* Row(int16_t* s) const { return reinterpret_cast<uint8_t*>(s + sumSize + 2 * bytesSize); }
-    size_t sumSize, bytesSize, rowSize;
+    uint16_t* Planes(int16_t* s) const { return reinterpret_cast<uint16_t*>(s + sumSize); }
+    uint8_t* PlaneBytes(int16_t* s) const { return reinterpret_cast<uint8_t*>(s + sumSize + 3 * stride); }
+    uint8_t* Row(int16_t* s) const { return reinterpret_cast<uint8_t*>(s + sumSize + 6 * stride); }
+    size_t sumSize, stride, rowSize;
 };
 
 // Destination row t (GetPtrXY order) of the expand of src into a dw x dh image, written to
@@ -302,7 +301,7 @@ void ExpandRow(const CImage& src, int dw, int dh, int t, const ExpandScratch& la
     if (ch == 1) {
         HWY_DYNAMIC_DISPATCH(ExpandRowGrey)(sum, sw, out);
     } else {
-        HWY_DYNAMIC_DISPATCH(ExpandRowColour)(sum, sw, layout.On(scratch), layout.Between(scratch), out);
+        HWY_DYNAMIC_DISPATCH(ExpandRowColour)(sum, sw, layout.stride, layout.Planes(scratch), layout.PlaneBytes(scratch), out);
     }
     for (int x : {0, 1}) {
         for (int c = 0; c < ch; ++c) out[x * ch + c] = static_cast<uint8_t>(ExpandEdge(sum, ch, c, sw, dw, x) >> 6);
@@ -317,7 +316,7 @@ void ExpandRow(const CImage& src, int dw, int dh, int t, const ExpandScratch& la
 
 void FastExpand(const CImage& src, CImage& dst, int16_t* work, size_t capacity) {
     const int dw = dst.GetWidth(), dh = dst.GetHeight();
-    const ExpandScratch layout(static_cast<size_t>(src.GetWidth()) * (src.GetBitCount() / 8), dst.GetSpan());
+    const ExpandScratch layout(src.GetWidth(), static_cast<size_t>(src.GetWidth()) * (src.GetBitCount() / 8), dst.GetSpan());
     auto expandRows = [&](int begin, int end, int16_t* scratch) {
         for (int t = begin; t < end; ++t) ExpandRow(src, dw, dh, t, layout, scratch, dst.GetPtrXY(0, t), dst.GetSpan());
     };
@@ -327,7 +326,7 @@ void FastExpand(const CImage& src, CImage& dst, int16_t* work, size_t capacity) 
 bool FastExpandCombine(const CImage& coarse, CImage& target, bool add, int16_t* work, size_t capacity) {
     const int dw = target.GetWidth(), dh = target.GetHeight();
     const size_t span = target.GetSpan();
-    const ExpandScratch layout(static_cast<size_t>(coarse.GetWidth()) * (coarse.GetBitCount() / 8), span);
+    const ExpandScratch layout(coarse.GetWidth(), static_cast<size_t>(coarse.GetWidth()) * (coarse.GetBitCount() / 8), span);
     auto combineRows = [&](int begin, int end, int16_t* scratch) {
         uint8_t* expanded = layout.Row(scratch);
         for (int t = begin; t < end; ++t) {
