@@ -109,11 +109,6 @@ bool warpAffineWith(const float* m, const CImage& src, CImage& dst, bool fit, co
         if (corners != nullptr) reportCorners(landed, win, corners);
     }
     if (bits != 8 && bits != 24) return false;
-    // A destination of another depth would be written past its rows.
-    if (dst.GetBitCount() != bits) {
-        Trace(L"WarpAffine: destination depth differs from source\n");
-        return false;
-    }
 
     float fracX = 0.0f, fracY = 0.0f;
     int offX = 0, offY = 0;  // whole-pixel shift; only a negative one moves the content
@@ -128,6 +123,11 @@ bool warpAffineWith(const float* m, const CImage& src, CImage& dst, bool fit, co
     const int64_t firstRow = static_cast<int64_t>(win.minY) - offY;
     if (firstCol >= win.maxX || firstRow >= win.maxY) {
         Trace(L"WarpAffine: out of range\n");
+        return false;
+    }
+    // A destination of another depth would be written past its rows.
+    if (dst.GetBitCount() != bits) {
+        Trace(L"WarpAffine: destination depth differs from source\n");
         return false;
     }
 
