@@ -1,8 +1,6 @@
 #include <gtest/gtest.h>
 
-#include <cstdlib>
 #include <cstring>
-#include <filesystem>
 #include <random>
 
 #include <hwy/targets.h>
@@ -13,30 +11,6 @@ using namespace testpics;
 using Access = CCheatIRTestAccess;
 
 namespace {
-
-class DumpDir {
-public:
-    explicit DumpDir(const char* name) : m_dir(std::filesystem::temp_directory_path() / name) {
-        std::filesystem::remove_all(m_dir);
-        setenv("VARNOTH_DUMP_DIR", m_dir.c_str(), 1);
-    }
-    ~DumpDir() {
-        unsetenv("VARNOTH_DUMP_DIR");
-        std::filesystem::remove_all(m_dir);
-    }
-    std::filesystem::path File(const char* name) const { return m_dir / "results" / name; }
-
-private:
-    std::filesystem::path m_dir;
-};
-
-CImage Noise(int w, int h, unsigned seed) {
-    CImage img(w, h, 8);
-    std::mt19937 random(seed);
-    for (int y = 0; y < h; ++y)
-        for (int x = 0; x < w; ++x) img.GetPtrXY(0, y)[x] = static_cast<uint8_t>(random());
-    return img;
-}
 
 TEST(Grade, MatchesIdenticalNegativeAndUniformWindows) {
     CCheatIR cheat;
@@ -50,11 +24,6 @@ TEST(Grade, MatchesIdenticalNegativeAndUniformWindows) {
     EXPECT_NEAR(Access::Grade(cheat, a, negative), 2.0f, 1e-6f);
     EXPECT_EQ(Access::Grade(cheat, uniform, a), 0.0f);
     EXPECT_EQ(Access::Grade(cheat, a, uniform), 0.0f);
-    Access::Window b(25);
-    for (int i = 0; i < 25; ++i) b[i] = static_cast<uint8_t>(i == 24 ? 200 : i);
-    const float g = Access::Grade(cheat, a, b);
-    EXPECT_GT(g, 0.0f);
-    EXPECT_LT(g, 1.0f);
 }
 
 TEST(BuildBaseWin, PacksTheInsidePartAtTheBorder) {
@@ -128,7 +97,7 @@ TEST(ChannelMatchAndWarp, WritesNothingWithoutSegmentsAndWhiteForPointlessOnes) 
     EXPECT_TRUE(Access::ChannelMatchAndWarp(cheat, channel, reference));
     EXPECT_FALSE(std::filesystem::exists(dumps.File("localMap.bmp")));
     CImage picture;
-    ASSERT_TRUE(picture.ImportFile(dumps.File("acumMap.bmp").string()));
+    ASSERT_TRUE(picture.ImportFile(dumps.File("acumMap.bmp")));
     ASSERT_EQ(picture.GetWidth(), 21);
     for (int y = 0; y < 21; ++y)
         for (int i = 0; i < 21 * picture.GetBitCount() / 8; ++i) ASSERT_EQ(picture.GetPtrXY(0, y)[i], 255);
@@ -143,9 +112,9 @@ TEST(ChannelMatchAndWarp, DumpsTheLastPointsMapsAndTheSegmentsSum) {
     EXPECT_TRUE(Access::ChannelMatchAndWarp(cheat, channel, reference));
     EXPECT_TRUE(SamePixels(channel, reference));
     CImage local, base, sum;
-    ASSERT_TRUE(local.ImportFile(dumps.File("localMap.bmp").string()));
-    ASSERT_TRUE(base.ImportFile(dumps.File("baseMap.bmp").string()));
-    ASSERT_TRUE(sum.ImportFile(dumps.File("acumMap.bmp").string()));
+    ASSERT_TRUE(local.ImportFile(dumps.File("localMap.bmp")));
+    ASSERT_TRUE(base.ImportFile(dumps.File("baseMap.bmp")));
+    ASSERT_TRUE(sum.ImportFile(dumps.File("acumMap.bmp")));
     EXPECT_EQ(At(local, 10, 10), 0);  // offset (0, 0) matches exactly
     EXPECT_GT(At(local, 0, 0), 0);
     for (int i = 0; i < 5; ++i)

@@ -3,7 +3,10 @@
 // Reaches CCheatIR's private operations and lists for the tests, plus small picture helpers.
 
 #include <cstdint>
+#include <cstdlib>
 #include <deque>
+#include <filesystem>
+#include <random>
 #include <string>
 
 #include "channels/CheatIR.h"
@@ -48,6 +51,39 @@ inline void Fill(CImage& img, int x0, int y0, int x1, int y1, uint8_t value) {  
 inline uint8_t At(const CImage& img, int x, int y) { return img.GetPtrXY(0, y)[x]; }
 inline uint16_t Label(const CImage& img, int x, int y) { return channels::RowU16(img, y)[x]; }
 inline int16_t Deriv(const CImage& img, int x, int y) { return channels::Row16(img, y)[x]; }
+
+inline CImage Noise(int w, int h, unsigned seed) {
+    CImage img(w, h, 8);
+    std::mt19937 random(seed);
+    for (int y = 0; y < h; ++y)
+        for (int x = 0; x < w; ++x) img.GetPtrXY(0, y)[x] = static_cast<uint8_t>(random());
+    return img;
+}
+
+// Debug pictures go to a fresh temporary folder while this lives.
+class DumpDir {
+public:
+    explicit DumpDir(const char* name) : m_dir(std::filesystem::temp_directory_path() / name) {
+        std::filesystem::remove_all(m_dir);
+        setenv("VARNOTH_DUMP_DIR", m_dir.c_str(), 1);
+    }
+    ~DumpDir() {
+        unsetenv("VARNOTH_DUMP_DIR");
+        std::filesystem::remove_all(m_dir);
+    }
+    std::string File(const char* name) const { return (m_dir / "results" / name).string(); }
+
+private:
+    std::filesystem::path m_dir;
+};
+
+// Every pixel byte (padding aside) equals v.
+inline bool AllBytes(const CImage& img, uint8_t v) {
+    for (int y = 0; y < img.GetHeight(); ++y)
+        for (int i = 0; i < img.GetWidth() * img.GetBitCount() / 8; ++i)
+            if (img.GetPtrXY(0, y)[i] != v) return false;
+    return true;
+}
 
 inline bool SamePixels(const CImage& a, const CImage& b) {
     if (a.GetWidth() != b.GetWidth() || a.GetHeight() != b.GetHeight() || a.GetBitCount() != b.GetBitCount())

@@ -31,13 +31,6 @@ struct Edges {
     std::deque<SLabelPair>& Pairs() { return CCheatIRTestAccess::Pairs(cheat); }
 };
 
-bool AllBytes(const CImage& img, uint8_t v) {
-    for (int y = 0; y < img.GetHeight(); ++y)
-        for (int i = 0; i < img.GetWidth() * img.GetBitCount() / 8; ++i)
-            if (img.GetPtrXY(0, y)[i] != v) return false;
-    return true;
-}
-
 TEST(EdgesFind, UniformSourceMarksAndLabelsNothing) {
     Edges e(Grey(20, 15, 77));
     EXPECT_TRUE(AllBytes(e.dr, 0) && AllBytes(e.dc, 0));

@@ -1,7 +1,5 @@
 #include <gtest/gtest.h>
 
-#include <cstdlib>
-#include <filesystem>
 #include <random>
 
 #include "channels/CheatIRTestAccess.h"
@@ -130,19 +128,14 @@ TEST(OutlineSampling, SamplesEveryTenthColumnAndRowOfTheMiddle) {
 }
 
 TEST(SegmentsFind, PlaneWithoutStrokesGivesNoSegmentsAndAWhitePicture) {
-    const std::filesystem::path dir = std::filesystem::temp_directory_path() / "varnoth_channels_groups";
-    std::filesystem::remove_all(dir);
-    setenv("VARNOTH_DUMP_DIR", dir.c_str(), 1);
+    DumpDir dumps("varnoth_channels_groups");
     CCheatIR cheat;
     CCheatIRTestAccess::SegmentsFind(cheat, Grey(40, 30, 180));
-    unsetenv("VARNOTH_DUMP_DIR");
     EXPECT_TRUE(CCheatIRTestAccess::Segments(cheat).empty());
     CImage picture;
-    ASSERT_TRUE(picture.ImportFile((dir / "results" / "groups.bmp").string()));
+    ASSERT_TRUE(picture.ImportFile(dumps.File("groups.bmp")));
     EXPECT_EQ(picture.GetWidth(), 40);
-    for (int y = 0; y < 30; ++y)
-        for (int i = 0; i < 40 * picture.GetBitCount() / 8; ++i) ASSERT_EQ(picture.GetPtrXY(0, y)[i], 255);
-    std::filesystem::remove_all(dir);
+    EXPECT_TRUE(AllBytes(picture, 255));
 }
 
 TEST(SegmentsFind, RingBecomesOneSegmentWithOutlinePoints) {
@@ -153,17 +146,14 @@ TEST(SegmentsFind, RingBecomesOneSegmentWithOutlinePoints) {
     // they are never labelled.
     Fill(src, 70, 0, 72, 79, 30);
     Fill(src, 0, 70, 79, 72, 30);
-    const std::filesystem::path dir = std::filesystem::temp_directory_path() / "varnoth_channels_ring";
-    setenv("VARNOTH_DUMP_DIR", dir.c_str(), 1);
+    DumpDir dumps("varnoth_channels_ring");
     CCheatIR cheat;
     CCheatIRTestAccess::SegmentsFind(cheat, src);
-    unsetenv("VARNOTH_DUMP_DIR");
     const std::deque<SSegment>& segments = CCheatIRTestAccess::Segments(cheat);
     ASSERT_EQ(segments.size(), 1u);
     // The picture: white paper, the group's label 0 times 240 / n, the box in red.
     CImage picture;
-    ASSERT_TRUE(picture.ImportFile((dir / "results" / "groups.bmp").string()));
-    std::filesystem::remove_all(dir);
+    ASSERT_TRUE(picture.ImportFile(dumps.File("groups.bmp")));
     ASSERT_EQ(picture.GetBitCount(), 24);  // the red palette entry makes it colour
     auto bgr = [&](int x, int y) {
         const uint8_t* p = picture.GetPtrXY(x, y);
@@ -173,13 +163,10 @@ TEST(SegmentsFind, RingBecomesOneSegmentWithOutlinePoints) {
     EXPECT_EQ(bgr(40, 20), 0x0000FF);
     EXPECT_EQ(bgr(59, 40), 0x0000FF);
     EXPECT_EQ(bgr(22, 40), 0x000000);
-    const RECT& r = segments[0].rect;
-    EXPECT_EQ(r, (RECT{20, 20, 59, 59}));
+    EXPECT_EQ(segments[0].rect, (RECT{20, 20, 59, 59}));
+    ASSERT_FALSE(segments[0].points.empty());
     EXPECT_EQ(segments[0].points.front(), CPoint(24, 20));  // sx = 39 / 8 = 4
-    EXPECT_FALSE(segments[0].points.empty());
-    for (const CPoint& p : segments[0].points) {
-        EXPECT_LT(std::abs(At(src, p.x, p.y) - 30), 1) << p.x << "," << p.y;
-    }
+    for (const CPoint& p : segments[0].points) EXPECT_EQ(At(src, p.x, p.y), 30) << p.x << "," << p.y;
 }
 
 }  // namespace
