@@ -5,6 +5,7 @@
 #include <algorithm>
 #include <cmath>
 #include <cstdint>
+#include <memory>
 #include <vector>
 
 #include "holograms/FourImageHsvInternal.h"
@@ -142,10 +143,18 @@ namespace {
 // are added up afterwards (sums of counts do not depend on the split).
 constexpr int kBands = 64;
 
+// The candidates' HSV triples and saturation flags of one level. Allocated once for the
+// finest level and reused by the coarser ones; every byte is written before it is read.
 struct LevelPlanes {
+    explicit LevelPlanes(size_t maxPixels) {
+        for (int i = 0; i < 4; ++i) {
+            hsv[i] = std::make_unique_for_overwrite<uint8_t[]>(3 * maxPixels);
+            mask[i] = std::make_unique_for_overwrite<uint8_t[]>(maxPixels);
+        }
+    }
     int width = 0, height = 0;
-    std::vector<uint8_t> hsv[4];   // 3 bytes a pixel
-    std::vector<uint8_t> mask[4];  // 1 = saturated
+    std::unique_ptr<uint8_t[]> hsv[4];   // 3 bytes a pixel
+    std::unique_ptr<uint8_t[]> mask[4];  // 1 = saturated
 };
 
 void FirstPass(const CPyramid lap[4], const CPyramid gauss[4], int level, LevelPlanes& planes,
@@ -241,15 +250,10 @@ void CHologramsRemove::HologramsRemove4Img4(const CImage& top, const CImage& bot
         }
     });
 
-    LevelPlanes planes;
+    LevelPlanes planes(static_cast<size_t>(top.GetWidth()) * top.GetHeight());
     for (int level = coarsest - 1; level >= 0; --level) {
         planes.width = laplacian[0].GetLevel(level).GetWidth();
         planes.height = laplacian[0].GetLevel(level).GetHeight();
-        const size_t pixels = static_cast<size_t>(planes.width) * planes.height;
-        for (int i = 0; i < 4; ++i) {
-            planes.hsv[i].resize(3 * pixels);
-            planes.mask[i].resize(pixels);
-        }
         uint32_t histS[256] = {}, histV[256] = {};
         FirstPass(laplacian, gaussian, level, planes, histS, histV);
         const int64_t n = static_cast<int64_t>(planes.width) * planes.height * 15 / 100;
