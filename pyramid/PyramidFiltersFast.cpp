@@ -189,11 +189,19 @@ bool RunBands(int rows, size_t slice, int16_t* work, size_t capacity, const Band
     const int threads = std::max(1, imagelib::GetThreadLimit());
     int bands = std::min(std::max(1, rows / kMinRowsPerBand), 8 * threads);
     bands = static_cast<int>(std::min<size_t>(static_cast<size_t>(bands), fitting));
-    imagelib::ParallelFor(0, bands, [&](int first, int end) {
+    // The task body captures one pointer, so handing it to the parallel-for allocates nothing.
+    struct Bands {
+        int rows, count;
+        size_t slice;
+        int16_t* work;
+        const BandBody* body;
+    } bandsOf{rows, bands, slice, work, &body};
+    const Bands* plan = &bandsOf;
+    imagelib::ParallelFor(0, bands, [plan](int first, int end) {
         for (int b = first; b < end; ++b) {
-            const int begin = static_cast<int>(static_cast<int64_t>(rows) * b / bands);
-            const int stop = static_cast<int>(static_cast<int64_t>(rows) * (b + 1) / bands);
-            body(begin, stop, work + static_cast<size_t>(b) * slice);
+            const int begin = static_cast<int>(static_cast<int64_t>(plan->rows) * b / plan->count);
+            const int stop = static_cast<int>(static_cast<int64_t>(plan->rows) * (b + 1) / plan->count);
+            (*plan->body)(begin, stop, plan->work + static_cast<size_t>(b) * plan->slice);
         }
     });
     return true;
