@@ -6,7 +6,7 @@
 #include "imagelib/CImage.h"
 
 // The reduce and expand filters behind CPyramid. The plain versions are the definition of
-// every output byte (single thread, written as the filters are specified); the fast versions
+// every output byte (single thread, one literal pass after the other); the fast versions
 // give the same bytes with vector kernels and rows split among workers.
 namespace varnoth {
 

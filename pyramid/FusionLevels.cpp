@@ -18,14 +18,18 @@ bool SameGeometry(const CImage& a, const CImage& b) {
     return a.GetWidth() == b.GetWidth() && a.GetHeight() == b.GetHeight() && a.GetBitCount() == b.GetBitCount();
 }
 
-// |4c - l - r - u - d| on byte `offset` of the pixel at byte x of row y.
-int DetailMeasure(const CImage& image, int x, int y, int ch, int offset) {
-    const unsigned char* row = image.GetPtrXY(0, y);
-    const int c = row[x + offset];
-    const int l = row[x - ch + offset], r = row[x + ch + offset];
-    const int u = image.GetPtrXY(0, y - 1)[x + offset], d = image.GetPtrXY(0, y + 1)[x + offset];
-    return std::abs(4 * c - l - r - u - d);
-}
+// Rows y - 1, y and y + 1 of an image.
+struct RowTriple {
+    RowTriple(const CImage& image, int y)
+        : up(image.GetPtrXY(0, y - 1)), row(image.GetPtrXY(0, y)), down(image.GetPtrXY(0, y + 1)) {}
+    // |4c - l - r - u - d| on byte i (the test byte of a pixel; neighbours ch bytes away).
+    int DetailMeasure(int i, int ch) const {
+        return std::abs(4 * row[i] - row[i - ch] - row[i + ch] - up[i] - down[i]);
+    }
+    const unsigned char* up;
+    const unsigned char* row;
+    const unsigned char* down;
+};
 
 // Copies `count` pixels from src row srcY (from pixel srcX) to dst row dstY (from pixel dstX),
 // dropping the pixels that fall outside either row.
@@ -97,10 +101,10 @@ void CFusion::FuseLevelNonMasked(int level) {
     // left and in the row before.
     for (int y = 1; y <= a.GetHeight() - 2; ++y) {
         unsigned char* pa = a.GetPtrXY(0, y);
-        const unsigned char* pb = b.GetPtrXY(0, y);
+        const RowTriple rowsA(a, y), rowsB(b, y);
         for (int x = ch; x <= lastX; x += ch) {
-            if (DetailMeasure(a, x, y, ch, test) > DetailMeasure(b, x, y, ch, test)) continue;
-            std::memcpy(pa + x, pb + x, ch);
+            if (rowsA.DetailMeasure(x + test, ch) > rowsB.DetailMeasure(x + test, ch)) continue;
+            std::memcpy(pa + x, rowsB.row + x, ch);
         }
     }
 }
