@@ -20,41 +20,53 @@ namespace {
 
 // Output rows [yBegin, yEnd) of a block-maximum downscale by `factor`. The maxima of each
 // channel are taken over the block's rows first (one running row of maxima), then across the
-// block's columns. `toGrey` stores (maxB + maxG + maxR) / 3 in an 8-bit destination.
-void BlockMaxRows(const CImage& source, CImage& destination, int factor, int bytesPerPixel, bool toGrey,
-                  int yBegin, int yEnd) {
+// block's columns. `kGrey` stores (maxB + maxG + maxR) / 3 in an 8-bit destination. kFactor is
+// 0 for a factor known only at run time; the fixed factors let the compiler unroll the blocks.
+template <int kFactor, int kBytesPerPixel, bool kGrey>
+void BlockMaxRows(const CImage& source, CImage& destination, int runtimeFactor, int yBegin, int yEnd) {
+    const int factor = kFactor != 0 ? kFactor : runtimeFactor;
     const int outWidth = destination.GetWidth();
-    const size_t rowBytes = static_cast<size_t>(outWidth) * factor * bytesPerPixel;
+    const size_t rowBytes = static_cast<size_t>(outWidth) * factor * kBytesPerPixel;
     std::vector<unsigned char> columnMax(rowBytes);
     for (int y = yBegin; y < yEnd; ++y) {
         const unsigned char* first = Row(source, factor * y);
         std::copy(first, first + rowBytes, columnMax.begin());
         for (int k = 1; k < factor; ++k) {
             const unsigned char* row = Row(source, factor * y + k);
-            for (size_t i = 0; i < rowBytes; ++i) columnMax[i] = std::max(columnMax[i], row[i]);
+            unsigned char* m = columnMax.data();
+            for (size_t i = 0; i < rowBytes; ++i) m[i] = m[i] < row[i] ? row[i] : m[i];
         }
         unsigned char* out = Row(destination, y);
         for (int x = 0; x < outWidth; ++x) {
-            const unsigned char* block = columnMax.data() + static_cast<size_t>(x) * factor * bytesPerPixel;
-            int maxima[3] = {0, 0, 0};
+            const unsigned char* block = columnMax.data() + static_cast<size_t>(x) * factor * kBytesPerPixel;
+            int maxima[kBytesPerPixel] = {};
             for (int j = 0; j < factor; ++j)
-                for (int c = 0; c < bytesPerPixel; ++c) maxima[c] = std::max<int>(maxima[c], block[j * bytesPerPixel + c]);
-            if (toGrey) {
+                for (int c = 0; c < kBytesPerPixel; ++c) maxima[c] = std::max<int>(maxima[c], block[j * kBytesPerPixel + c]);
+            if constexpr (kGrey) {
                 out[x] = static_cast<unsigned char>((maxima[0] + maxima[1] + maxima[2]) / 3);
             } else {
-                for (int c = 0; c < bytesPerPixel; ++c) out[x * bytesPerPixel + c] = static_cast<unsigned char>(maxima[c]);
+                for (int c = 0; c < kBytesPerPixel; ++c) out[x * kBytesPerPixel + c] = static_cast<unsigned char>(maxima[c]);
             }
         }
     }
 }
 
+using BlockMaxKernel = void (*)(const CImage&, CImage&, int, int, int);
+
+BlockMaxKernel ChooseBlockMax(int factor, int bytesPerPixel, bool toGrey) {
+    if (bytesPerPixel == 1) return BlockMaxRows<0, 1, false>;
+    if (toGrey) return factor == 3 ? BlockMaxRows<3, 3, true> : BlockMaxRows<0, 3, true>;
+    if (factor == 2) return BlockMaxRows<2, 3, false>;
+    if (factor == 3) return BlockMaxRows<3, 3, false>;
+    return BlockMaxRows<0, 3, false>;
+}
+
 void ScaleDownBlockMax(const CImage& source, CImage& destination, int factor, bool toGrey) {
-    const int bytesPerPixel = source.GetBitCount() / 8;
+    const BlockMaxKernel kernel = ChooseBlockMax(factor, source.GetBitCount() / 8, toGrey);
     destination.Reallocate(source.GetWidth() / factor, source.GetHeight() / factor, toGrey ? 8 : source.GetBitCount(), 0);
     if (destination.IsEmpty()) return;
     imagelib::ParallelFor(
-        0, destination.GetHeight(),
-        [&](int begin, int end) { BlockMaxRows(source, destination, factor, bytesPerPixel, toGrey, begin, end); }, 16);
+        0, destination.GetHeight(), [&](int begin, int end) { kernel(source, destination, factor, begin, end); }, 16);
 }
 
 // The fixed-factor variants read three bytes per pixel; anything but a 24-bit source would be
@@ -69,34 +81,53 @@ void ScaleDownFixed(const wchar_t* name, CImage& source, CImage& destination, in
     }
 }
 
+// Exact n / d for the box sums: a floating-point estimate, corrected by one step (the estimate
+// is never off by more than one for the sums that occur).
+class ExactDivider {
+public:
+    explicit ExactDivider(uint64_t divisor) : m_divisor(divisor), m_inverse(1.0 / static_cast<double>(divisor)) {}
+    uint64_t operator()(uint64_t n) const {
+        uint64_t q = static_cast<uint64_t>(static_cast<double>(n) * m_inverse);
+        if (q * m_divisor > n)
+            --q;
+        else if ((q + 1) * m_divisor <= n)
+            ++q;
+        return q;
+    }
+
+private:
+    uint64_t m_divisor;
+    double m_inverse;
+};
+
 // Box-average output rows for the input rows y in [yBegin, yEnd), W <= y < height. The column
 // sums are rebuilt from rows yBegin - W ... yBegin - 1, so bands are independent and the result
 // is that of one pass over all rows.
-void BoxAverageBand(const CImage& source, CImage& destination, int window, int bytesPerPixel, int yBegin,
-                    int yEnd) {
+template <int kBytesPerPixel>
+void BoxAverageBand(const CImage& source, CImage& destination, int window, int yBegin, int yEnd) {
     const int width = source.GetWidth();
     const int half = window / 2;
-    const size_t rowBytes = static_cast<size_t>(width) * bytesPerPixel;
-    const uint64_t area = static_cast<uint64_t>(window) * static_cast<uint64_t>(window);
+    const size_t rowBytes = static_cast<size_t>(width) * kBytesPerPixel;
+    const ExactDivider divide(static_cast<uint64_t>(window) * static_cast<uint64_t>(window));
     std::vector<uint32_t> columnSum(rowBytes, 0);
     for (int r = yBegin - window; r < yBegin; ++r) {
         const unsigned char* row = Row(source, r);
         for (size_t i = 0; i < rowBytes; ++i) columnSum[i] += row[i];
     }
+    const uint32_t* columns = columnSum.data();
     for (int y = yBegin; y < yEnd; ++y) {
-        unsigned char* out = Row(destination, y - window + half);
-        uint64_t sums[3] = {0, 0, 0};
-        for (int x = 0; x < width; ++x) {
-            const size_t at = static_cast<size_t>(x) * bytesPerPixel;
-            if (x >= window) {
-                const size_t dropped = at - static_cast<size_t>(window) * bytesPerPixel;
-                const size_t stored = dropped + static_cast<size_t>(half) * bytesPerPixel;
-                for (int c = 0; c < bytesPerPixel; ++c) {
-                    out[stored + c] = static_cast<unsigned char>(sums[c] / area);
-                    sums[c] -= columnSum[dropped + c];
-                }
+        unsigned char* out = Row(destination, y - window + half) + static_cast<size_t>(half) * kBytesPerPixel;
+        uint64_t sums[kBytesPerPixel] = {};
+        for (int x = 0; x < window; ++x)
+            for (int c = 0; c < kBytesPerPixel; ++c) sums[c] += columns[x * kBytesPerPixel + c];
+        // Window x - W ... x - 1 lands at x - W + h; then it slides by one column.
+        for (int x = window; x < width; ++x) {
+            const size_t dropped = static_cast<size_t>(x - window) * kBytesPerPixel;
+            const size_t added = static_cast<size_t>(x) * kBytesPerPixel;
+            for (int c = 0; c < kBytesPerPixel; ++c) {
+                out[dropped + c] = static_cast<unsigned char>(divide(sums[c]));
+                sums[c] += static_cast<uint64_t>(columns[added + c]) - columns[dropped + c];
             }
-            for (int c = 0; c < bytesPerPixel; ++c) sums[c] += columnSum[at + c];
         }
         const unsigned char* leaving = Row(source, y - window);
         const unsigned char* entering = Row(source, y);
@@ -110,13 +141,12 @@ bool WindowFits(const CImage& image, int window) {
 }
 
 void BoxAverage(const CImage& source, CImage& destination, int window) {
-    const int bytesPerPixel = source.GetBitCount() / 8;
+    const auto band = source.GetBitCount() == 8 ? BoxAverageBand<1> : BoxAverageBand<3>;
     destination.Reallocate(source.GetWidth(), source.GetHeight(), source.GetBitCount(), 0);
     if (!WindowFits(source, window)) return;
     // Bands of at least 4 windows keep the cost of rebuilding the column sums small.
     imagelib::ParallelFor(
-        window, source.GetHeight(),
-        [&](int begin, int end) { BoxAverageBand(source, destination, window, bytesPerPixel, begin, end); },
+        window, source.GetHeight(), [&](int begin, int end) { band(source, destination, window, begin, end); },
         std::max(4 * window, 32));
 }
 

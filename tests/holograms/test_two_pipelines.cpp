@@ -2,6 +2,7 @@
 
 #include <string>
 #include <thread>
+#include <utility>
 
 #include "scene/TwoShotScene.h"
 #include "test_two_support.h"
@@ -88,5 +89,21 @@ TEST(TwoPipelines, EveryPipelineLeavesLessGlareThanEitherShot) {
                     scene::Evaluate(s, image1).psnr);
         EXPECT_LT(share, shot1) << method;
         EXPECT_LT(share, shot2) << method;
+    }
+}
+
+// Shots too small for the windows and borders of the pipelines pass through without harm.
+TEST(TwoPipelines, TinyShotsAreHandled) {
+    for (const auto& size : {std::pair{1, 1}, std::pair{2, 3}, std::pair{5, 5}, std::pair{17, 9}, std::pair{70, 40}}) {
+        for (int method = 1; method <= 3; ++method) {
+            CHologramsRemove remover;
+            CImage a = RandomImage(size.first, size.second, 24, 40), b = RandomImage(size.first, size.second, 24, 41);
+            CImage unused;
+            if (method == 1) remover.HologramsSeperation(a, b, unused, 0, size.second);
+            if (method == 2) remover.HologramsSeperation2(a, b, unused, 0, size.second);
+            if (method == 3) remover.HologramsSeperation3(a, b, unused, -100, 1000);
+            EXPECT_EQ(a.GetWidth(), size.first);
+            EXPECT_EQ(a.GetHeight(), size.second);
+        }
     }
 }
