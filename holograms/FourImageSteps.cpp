@@ -190,6 +190,9 @@ void CHologramsRemove::HologramsRemove4ImgInSteps(const CImage& image, uint16_t 
         }
     }
 
+    // Until this step completes the members are in flux: if it throws (out of memory), later
+    // steps 1 to 3 are refused until a new step 0.
+    m_lastStep = -1;
     m_inputPyr[step].Init(image, kLevels);
     m_inputPyr[step].MakeLaplacian(&m_inputGauss);
     const StateMaps maps{&m_satInfo, &m_minBright, &m_minBrightIdx, &m_secBright, &m_secBrightIdx,
