@@ -134,7 +134,8 @@ void BM_OpenCvPyrUp(benchmark::State& state) {
     const int bits = static_cast<int>(state.range(0));
     setThreads(static_cast<int>(state.range(1)));
     cv::Mat small;
-    cv::pyrDown(wrap(page(bits)), small, cv::Size(CPyramid::NextLevelSize(kPageWidth), CPyramid::NextLevelSize(kPageHeight)));
+    const cv::Size half(CPyramid::NextLevelSize(kPageWidth), CPyramid::NextLevelSize(kPageHeight));
+    cv::pyrDown(wrap(page(bits)), small, half);
     cv::Mat dst;
     for (auto _ : state) {
         cv::pyrUp(small, dst, cv::Size(kPageWidth, kPageHeight));

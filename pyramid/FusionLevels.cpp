@@ -148,7 +148,8 @@ void CFusion::Fuse4Pyramids() {
                 CopyRun(m_pPyramids[left].GetLevel(k), s, 0, r, tl, start, w - start);
             }
             const int tr = s + base - pr.y;
-            if (tr >= 0 && tr < h && tr < r.GetHeight()) CopyRun(m_pPyramids[right].GetLevel(k), s, pr.x, r, tr, w, w - pr.x);
+            if (tr >= 0 && tr < h && tr < r.GetHeight())
+                CopyRun(m_pPyramids[right].GetLevel(k), s, pr.x, r, tr, w, w - pr.x);
         };
         for (int s = 0; s < h / 2; ++s) paste(3, 1, s);
         for (int s = h / 2; s < h; ++s) paste(2, 0, s);

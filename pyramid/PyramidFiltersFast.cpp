@@ -51,9 +51,10 @@ void WeightRows5(const uint8_t* const* r, uint16_t* sum, size_t n) {
     const auto six = hn::Set(d, 6);
     size_t e = 0;
     for (; e + lanes <= n; e += lanes) {
-        const auto outer = hn::Add(hn::PromoteTo(d, hn::LoadU(d8, r[0] + e)), hn::PromoteTo(d, hn::LoadU(d8, r[4] + e)));
-        const auto inner = hn::Add(hn::PromoteTo(d, hn::LoadU(d8, r[1] + e)), hn::PromoteTo(d, hn::LoadU(d8, r[3] + e)));
-        const auto centre = hn::PromoteTo(d, hn::LoadU(d8, r[2] + e));
+        auto rowAt = [&](int k) { return hn::PromoteTo(d, hn::LoadU(d8, r[k] + e)); };
+        const auto outer = hn::Add(rowAt(0), rowAt(4));
+        const auto inner = hn::Add(rowAt(1), rowAt(3));
+        const auto centre = rowAt(2);
         hn::StoreU(hn::Add(hn::Add(outer, hn::ShiftLeft<2>(inner)), hn::Mul(centre, six)), d, sum + e);
     }
     for (; e < n; ++e)
@@ -266,8 +267,10 @@ int ExpandEdge(const uint16_t* sum, int ch, int c, int sw, int dw, int x) {
 // Scratch of one band of expanded rows: vertical sums, (colour) three planes of sums and three
 // planes of expanded bytes, then (when combining) the expanded row itself.
 struct ExpandScratch {
-    ExpandScratch(size_t sw, size_t n, size_t rowBytes)
-        : sumSize(AlignUp(n)), stride(AlignUp(sw + 8)), rowSize(AlignUp(rowBytes / 2 + 8)) {}
+    ExpandScratch(const CImage& src, size_t rowBytes)
+        : sumSize(AlignUp(static_cast<size_t>(src.GetWidth()) * (src.GetBitCount() / 8))),
+          stride(AlignUp(static_cast<size_t>(src.GetWidth()) + 8)),
+          rowSize(AlignUp(rowBytes / 2 + 8)) {}
     size_t Slice(bool withRow) const { return sumSize + 6 * stride + (withRow ? rowSize : 0); }
     uint16_t* Sum(int16_t* s) const { return reinterpret_cast<uint16_t*>(s); }
     uint16_t* Planes(int16_t* s) const { return reinterpret_cast<uint16_t*>(s + sumSize); }
@@ -309,7 +312,8 @@ void ExpandRow(const CImage& src, int dw, int dh, int t, const ExpandScratch& la
     if (ch == 1) {
         HWY_DYNAMIC_DISPATCH(ExpandRowGrey)(sum, sw, out);
     } else {
-        HWY_DYNAMIC_DISPATCH(ExpandRowColour)(sum, sw, layout.stride, layout.Planes(scratch), layout.PlaneBytes(scratch), out);
+        HWY_DYNAMIC_DISPATCH(ExpandRowColour)(sum, sw, layout.stride, layout.Planes(scratch),
+                                              layout.PlaneBytes(scratch), out);
     }
     for (int x : {0, 1}) {
         for (int c = 0; c < ch; ++c) out[x * ch + c] = static_cast<uint8_t>(ExpandEdge(sum, ch, c, sw, dw, x) >> 6);
@@ -324,7 +328,7 @@ void ExpandRow(const CImage& src, int dw, int dh, int t, const ExpandScratch& la
 
 void FastExpand(const CImage& src, CImage& dst, int16_t* work, size_t capacity) {
     const int dw = dst.GetWidth(), dh = dst.GetHeight();
-    const ExpandScratch layout(src.GetWidth(), static_cast<size_t>(src.GetWidth()) * (src.GetBitCount() / 8), dst.GetSpan());
+    const ExpandScratch layout(src, dst.GetSpan());
     auto expandRows = [&](int begin, int end, int16_t* scratch) {
         for (int t = begin; t < end; ++t) ExpandRow(src, dw, dh, t, layout, scratch, dst.GetPtrXY(0, t), dst.GetSpan());
     };
@@ -334,7 +338,7 @@ void FastExpand(const CImage& src, CImage& dst, int16_t* work, size_t capacity) 
 bool FastExpandCombine(const CImage& coarse, CImage& target, bool add, int16_t* work, size_t capacity) {
     const int dw = target.GetWidth(), dh = target.GetHeight();
     const size_t span = target.GetSpan();
-    const ExpandScratch layout(coarse.GetWidth(), static_cast<size_t>(coarse.GetWidth()) * (coarse.GetBitCount() / 8), span);
+    const ExpandScratch layout(coarse, span);
     auto combineRows = [&](int begin, int end, int16_t* scratch) {
         uint8_t* expanded = layout.Row(scratch);
         for (int t = begin; t < end; ++t) {

@@ -171,7 +171,8 @@ TEST(Fusion, NegationThresholds) {
                 const int peak = std::max({pb[0], pb[1], pb[2]});
                 const bool ring = x == 0 || y == 0 || x == a.GetWidth() - 1 || y == a.GetHeight() - 1;
                 const bool flat = ring ? false : (std::abs(peak - 127) <= 3 || std::abs(peak - 127) >= 20);
-                for (int c = 0; c < 3; ++c) ASSERT_EQ(a.GetPtrXY(x, y)[c], flat ? 127 : pb[c]) << k << " " << x << "," << y;
+                for (int c = 0; c < 3; ++c)
+                    ASSERT_EQ(a.GetPtrXY(x, y)[c], flat ? 127 : pb[c]) << k << " " << x << "," << y;
             }
     }
 }

@@ -28,7 +28,8 @@ void AddFuseCommand(CLI::App& app) {
         bool negate = false;
     };
     auto args = std::make_shared<Args>();
-    CLI::App* cmd = app.add_subcommand("fuse", "Fuse two shots of one document: the sharper detail wins at every pixel");
+    CLI::App* cmd =
+        app.add_subcommand("fuse", "Fuse two shots of one document: the sharper detail wins at every pixel");
     cmd->add_option("A", args->a, "First image (8- or 24-bit)")->required();
     cmd->add_option("B", args->b, "Second image (same size and depth as A)")->required();
     cmd->add_option("--map", args->map, "8-bit blend map of the images' size: 0 takes A, 255 takes B");
@@ -92,7 +93,8 @@ void AddStitchCommand(CLI::App& app) {
         for (int slot = 1; slot < 4; ++slot) RequireSameGeometry(images[0], *paths[0], images[slot], *paths[slot]);
         CFusion fusion(args->levels, 4);
         for (int slot = 0; slot < 4; ++slot) {
-            const CPoint place(static_cast<int>(offsets[2 * order[slot]]), static_cast<int>(offsets[2 * order[slot] + 1]));
+            const int at = 2 * order[slot];
+            const CPoint place(static_cast<int>(offsets[at]), static_cast<int>(offsets[at + 1]));
             if (!fusion.AddImage(images[slot], place))
                 throw ToolError(TooSmall(*paths[slot], images[slot], args->levels, 0));
         }
