@@ -50,9 +50,9 @@ void DarkerOfFirstTwoRow(const unsigned char* const lap[4], unsigned char* out, 
     }
 }
 
-void ComposeRow(const unsigned char* const lap[4], const unsigned char* const gauss[4], unsigned char* out,
-                int width) {
-    for (int x = 0; x < width; ++x) {
+void ComposePixels(const unsigned char* const lap[4], const unsigned char* const gauss[4], unsigned char* out,
+                   int begin, int end) {
+    for (int x = begin; x < end; ++x) {
         const unsigned char* detail[4] = {lap[0] + 3 * x, lap[1] + 3 * x, lap[2] + 3 * x, lap[3] + 3 * x};
         const int bright[4] = {MaxChannel(gauss[0] + 3 * x), MaxChannel(gauss[1] + 3 * x),
                                MaxChannel(gauss[2] + 3 * x), MaxChannel(gauss[3] + 3 * x)};
@@ -128,9 +128,9 @@ void ComposePixel(const unsigned char* const detail[4], const int bright[4], uns
 }
 
 // HologramsRemove4Img3: the flattest detail among candidates below 250; top if none.
-void FlattestUnsaturatedRow(const unsigned char* const lap[4], const unsigned char* const gauss[4],
-                            unsigned char* out, int width) {
-    for (int x = 0; x < width; ++x) {
+void FlattestUnsaturatedPixels(const unsigned char* const lap[4], const unsigned char* const gauss[4],
+                               unsigned char* out, int begin, int end) {
+    for (int x = begin; x < end; ++x) {
         int best = 1000, chosen = 0;
         for (int i = 0; i < 4; ++i) {
             const int peak = MaxChannel(lap[i] + 3 * x);
@@ -185,7 +185,8 @@ void CHologramsRemove::HologramsRemove4Img(const CImage& top, const CImage& bott
                  [](const unsigned char* const lap[4], const unsigned char* const*, unsigned char* out, int width) {
                      holo4::DarkerOfFirstTwoRow(lap, out, width);
                  });
-    for (int level = kLevels - 2; level >= 0; --level) ComposeLevel(resultPyr, laplacian, gaussian, level, holo4::ComposeRow);
+    for (int level = kLevels - 2; level >= 0; --level)
+        ComposeLevel(resultPyr, laplacian, gaussian, level, holo4::ComposeRowFast);
     holo4::CollapseInto(resultPyr, result);
 }
 
@@ -200,6 +201,6 @@ void CHologramsRemove::HologramsRemove4Img3(const CImage& top, const CImage& bot
     holo4::BuildCandidatePyramids(candidates, laplacian, gaussian);
     resultPyr.ForceType(CPyramid::PyrLaplacian);
     for (int level = kLevels - 1; level >= 0; --level)
-        ComposeLevel(resultPyr, laplacian, gaussian, level, holo4::FlattestUnsaturatedRow);
+        ComposeLevel(resultPyr, laplacian, gaussian, level, holo4::FlattestUnsaturatedRowFast);
     holo4::CollapseInto(resultPyr, result);
 }

@@ -26,10 +26,16 @@ void ForEachRowBand(int height, const std::function<void(int, int)>& body);
 // brightness values (candidate order top, bottom, right, left).
 void ComposePixel(const unsigned char* const detail[4], const int bright[4], unsigned char* out);
 
-// Row rules of the two compositions.
+// Row rules of the two compositions. The plain forms take the pixels [begin, end) of rows
+// given by their start; they define the bytes. The fast forms do whole rows with vectors.
 void DarkerOfFirstTwoRow(const unsigned char* const lap[4], unsigned char* out, int width);
-void ComposeRow(const unsigned char* const lap[4], const unsigned char* const gauss[4], unsigned char* out, int width);
-void FlattestUnsaturatedRow(const unsigned char* const lap[4], const unsigned char* const gauss[4],
-                            unsigned char* out, int width);
+void ComposePixels(const unsigned char* const lap[4], const unsigned char* const gauss[4], unsigned char* out,
+                   int begin, int end);
+void FlattestUnsaturatedPixels(const unsigned char* const lap[4], const unsigned char* const gauss[4],
+                               unsigned char* out, int begin, int end);
+void ComposeRowFast(const unsigned char* const lap[4], const unsigned char* const gauss[4], unsigned char* out,
+                    int width);
+void FlattestUnsaturatedRowFast(const unsigned char* const lap[4], const unsigned char* const gauss[4],
+                                unsigned char* out, int width);
 
 }  // namespace holo4

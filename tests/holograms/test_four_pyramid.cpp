@@ -1,5 +1,8 @@
 #include <gtest/gtest.h>
 
+#include <random>
+#include <vector>
+
 #include "common/TestImages.h"
 #include "holograms/FourImagePyramidInternal.h"
 #include "holograms/test_four_support.h"
@@ -94,10 +97,10 @@ TEST(FourImagePyramid, Variant3BrightnessBoundAndAllSaturatedTakesTop) {
     const unsigned char g249[3] = {249, 0, 0}, g250[3] = {0, 250, 0};
     const unsigned char* gauss[4] = {g250, g250, g249, g250};
     unsigned char out[3];
-    holo4::FlattestUnsaturatedRow(lap, gauss, out, 1);
+    holo4::FlattestUnsaturatedPixels(lap, gauss, out, 0, 1);
     EXPECT_EQ(out[0], 80);
     const unsigned char* allBright[4] = {g250, g250, g250, g250};
-    holo4::FlattestUnsaturatedRow(lap, allBright, out, 1);
+    holo4::FlattestUnsaturatedPixels(lap, allBright, out, 0, 1);
     EXPECT_EQ(out[0], 100);
 }
 
@@ -126,4 +129,32 @@ TEST(FourImagePyramid, GlareLargelyGoneOnAGeneratedCard) {
     EXPECT_LT(scene::GlareShare(s, result), worstShot / 4);
     remover.HologramsRemove4Img3(s.shots[0], s.shots[1], s.shots[2], s.shots[3], result);
     EXPECT_LT(scene::GlareShare(s, result), worstShot / 4);
+}
+
+TEST(FourImagePyramid, VectorRowRulesMatchThePlainOnes) {
+    std::mt19937 rng(17);
+    for (int width : {1, 15, 16, 31, 64, 97, 130}) {
+        std::vector<unsigned char> lapBytes[4], gaussBytes[4];
+        const unsigned char* lap[4];
+        const unsigned char* gauss[4];
+        for (int i = 0; i < 4; ++i) {
+            lapBytes[i].resize(3 * width);
+            gaussBytes[i].resize(3 * width);
+            for (int k = 0; k < 3 * width; ++k) {
+                // Mostly quiet detail near 128 (the vector case), sometimes strong detail;
+                // brightness around the 240 and 250 bounds.
+                lapBytes[i][k] = static_cast<unsigned char>(rng() % 8 ? 125 + rng() % 7 : rng() % 256);
+                gaussBytes[i][k] = static_cast<unsigned char>(rng() % 6 ? rng() % 240 : 236 + rng() % 20);
+            }
+            lap[i] = lapBytes[i].data();
+            gauss[i] = gaussBytes[i].data();
+        }
+        std::vector<unsigned char> plain(3 * width), fast(3 * width);
+        holo4::ComposePixels(lap, gauss, plain.data(), 0, width);
+        holo4::ComposeRowFast(lap, gauss, fast.data(), width);
+        EXPECT_EQ(plain, fast) << width;
+        holo4::FlattestUnsaturatedPixels(lap, gauss, plain.data(), 0, width);
+        holo4::FlattestUnsaturatedRowFast(lap, gauss, fast.data(), width);
+        EXPECT_EQ(plain, fast) << width;
+    }
 }
