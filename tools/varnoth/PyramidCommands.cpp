@@ -68,11 +68,12 @@ void AddStitchCommand(CLI::App& app) {
         int levels = 6;
     };
     auto args = std::make_shared<Args>();
-    CLI::App* cmd = app.add_subcommand(
-        "stitch",
-        "Stitch four shots into one image twice as wide; the seams blend through the pyramids. The upper "
-        "half takes TOP_LEFT's pixels up to its x offset (ending at the middle) and TOP_RIGHT's from its x "
-        "offset on; the lower half likewise from BOTTOM_LEFT and BOTTOM_RIGHT. Rows move up by y - 150.");
+    CLI::App* cmd =
+        app.add_subcommand("stitch", "Stitch four shots into one image twice as wide, the seams blended by the pyramids");
+    cmd->footer(
+        "The upper half takes TOP_LEFT's pixels up to its x offset (ending at the middle) and TOP_RIGHT's from its "
+        "x offset on; the lower half likewise from BOTTOM_LEFT and BOTTOM_RIGHT. Each image's rows move up by its "
+        "y offset - 150; rows no image reaches stay white.");
     cmd->add_option("TOP_LEFT", args->topLeft, "Image for the upper left quarter")->required();
     cmd->add_option("TOP_RIGHT", args->topRight, "Image for the upper right quarter")->required();
     cmd->add_option("BOTTOM_LEFT", args->bottomLeft, "Image for the lower left quarter")->required();
