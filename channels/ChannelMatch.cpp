@@ -25,15 +25,19 @@ bool SearchClipped(const CPoint& p, int width, int height) {
     return p.x < reach || p.y < reach || p.x > width - 1 - reach || p.y > height - 1 - reach;
 }
 
-// Grades 0..2 (or accumulated ones scaled by `scale`) as bytes, limited to 255, truncated.
-void DumpMap(const float* entries, float scale, bool divide, const wchar_t* path) {
+// Map values as bytes: times 255, limited to 255, truncated toward zero.
+uint8_t MapByte(float v) {
+    const float scaled = v * 255.0f;
+    return scaled > 255.0f ? 255 : static_cast<uint8_t>(static_cast<int>(scaled));
+}
+
+// A 21 x 21 picture whose pixel in column j of row i is byteOf(entry 21 i + j).
+template <typename ToByte>
+void DumpMap(const float* entries, ToByte byteOf, const wchar_t* path) {
     CImage picture(kMapSide, kMapSide, 8);
     for (int i = 0; i < kMapSide; ++i) {
         uint8_t* row = picture.GetPtrXY(0, i);
-        for (int j = 0; j < kMapSide; ++j) {
-            const float v = divide ? entries[kMapSide * i + j] / scale * 255.0f : entries[kMapSide * i + j] * 255.0f;
-            row[j] = v > 255.0f ? 255 : static_cast<uint8_t>(static_cast<int>(v));
-        }
+        for (int j = 0; j < kMapSide; ++j) row[j] = byteOf(entries[kMapSide * i + j]);
     }
     picture.ExportFile(path);
 }
@@ -165,7 +169,7 @@ bool CCheatIR::ChannelMatchAndWarp(CImage& channel, const CImage& reference, std
             BuildBaseWin(point, reference, window);
             BuildLocalMap(point, channel, window, map);
             if (dumps) {
-                DumpMap(map.data(), 1.0f, false, L"\\results\\localMap.bmp");
+                DumpMap(map.data(), MapByte, L"\\results\\localMap.bmp");
                 DumpWindow(window.data());
             }
             MapAccumulate(map, accumulator);
@@ -174,13 +178,9 @@ bool CCheatIR::ChannelMatchAndWarp(CImage& channel, const CImage& reference, std
         float largest = 0.0f;
         for (int i = 0; i < kMapSize; ++i) largest = std::max(largest, accumulator[i]);
         if (dumps) {
-            if (largest == 0.0f) {
-                CImage picture(kMapSide, kMapSide, 8);
-                picture.Set(255);
-                picture.ExportFile(L"\\results\\acumMap.bmp");
-            } else {
-                DumpMap(accumulator.data(), largest, true, L"\\results\\acumMap.bmp");
-            }
+            // Sums relative to the largest; all white when every sum is 0 (e.g. no points).
+            const auto relative = [largest](float v) { return largest == 0.0f ? uint8_t{255} : MapByte(v / largest); };
+            DumpMap(accumulator.data(), relative, L"\\results\\acumMap.bmp");
         }
         if (grades != nullptr && s < grades->size()) {
             SSegmentGrades& out = (*grades)[s];
