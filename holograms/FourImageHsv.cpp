@@ -157,7 +157,7 @@ struct LevelPlanes {
     std::unique_ptr<uint8_t[]> mask[4];  // 1 = saturated
 };
 
-void FirstPass(const CPyramid lap[4], const CPyramid gauss[4], int level, LevelPlanes& planes,
+void FirstPass(const holo4::CandidatePyramids& c, int level, LevelPlanes& planes,
                uint32_t histS[256], uint32_t histV[256]) {
     const int w = planes.width, h = planes.height;
     std::vector<uint32_t> bandHist(static_cast<size_t>(kBands) * 512, 0);
@@ -168,10 +168,10 @@ void FirstPass(const CPyramid lap[4], const CPyramid gauss[4], int level, LevelP
             for (int y = static_cast<int>(static_cast<int64_t>(h) * band / kBands);
                  y < static_cast<int>(static_cast<int64_t>(h) * (band + 1) / kBands); ++y) {
                 const unsigned char* lapRow[4];
-                const unsigned char* gaussRow[4];
+                const unsigned char* brightRow[4];
                 for (int i = 0; i < 4; ++i) {
-                    lapRow[i] = lap[i].GetLevel(level).GetPtrXY(0, y);
-                    gaussRow[i] = gauss[i].GetLevel(level).GetPtrXY(0, y);
+                    lapRow[i] = c.laplacian[i].GetLevel(level).GetPtrXY(0, y);
+                    brightRow[i] = c.brightness[i][level].GetPtrXY(0, y);
                 }
                 for (int x = 0; x < w; ++x) {
                     const size_t at = static_cast<size_t>(y) * w + x;
@@ -182,7 +182,7 @@ void FirstPass(const CPyramid lap[4], const CPyramid gauss[4], int level, LevelP
                         CopyPixel(p, lapRow[i] + 3 * x);
                         holo4::RgbToHsv(p);
                         hsv[i] = p;
-                        saturated[i] = holo4::IsHsvSaturated(gaussRow[i] + 3 * x);
+                        saturated[i] = holo4::IsHsvSaturated(brightRow[i][x]);
                         planes.mask[i][at] = saturated[i] ? 1 : 0;
                     }
                     // Pixels where every shot is saturated have no spread and stay out.
@@ -233,8 +233,9 @@ void CHologramsRemove::HologramsRemove4Img4(const CImage& top, const CImage& bot
     if (!holo4::CheckFourInputs(top, bottom, left, right, L"HologramsRemove4Img4")) return;
     CPyramid resultPyr(kLevels, top.GetWidth(), top.GetHeight(), 3);
     const CImage* const candidates[4] = {&top, &bottom, &left, &right};
-    CPyramid laplacian[4], gaussian[4];
-    holo4::BuildCandidatePyramids(candidates, laplacian, gaussian);
+    holo4::CandidatePyramids pyramids;
+    holo4::BuildCandidatePyramids(candidates, pyramids);
+    const CPyramid* laplacian = pyramids.laplacian;
     resultPyr.ForceType(CPyramid::PyrLaplacian);
 
     const int coarsest = kLevels - 1;
@@ -255,7 +256,7 @@ void CHologramsRemove::HologramsRemove4Img4(const CImage& top, const CImage& bot
         planes.width = laplacian[0].GetLevel(level).GetWidth();
         planes.height = laplacian[0].GetLevel(level).GetHeight();
         uint32_t histS[256] = {}, histV[256] = {};
-        FirstPass(laplacian, gaussian, level, planes, histS, histV);
+        FirstPass(pyramids, level, planes, histS, histV);
         const int64_t n = static_cast<int64_t>(planes.width) * planes.height * 15 / 100;
         const int ts = holo4::SpreadThreshold(histS, n), tv = holo4::SpreadThreshold(histV, n);
         SecondPass(laplacian, level, planes, ts, tv, resultPyr.GetLevel(level));

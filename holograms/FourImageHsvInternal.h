@@ -8,10 +8,8 @@ namespace holo4 {
 constexpr int kHsvSaturation = 246;        // a Gaussian pixel this bright is saturated
 constexpr int kSaturationSimilarity = 5;   // S within this of the lowest counts as alike
 
-inline bool IsHsvSaturated(const unsigned char* gaussPixel) {
-    const int m = gaussPixel[0] > gaussPixel[1] ? gaussPixel[0] : gaussPixel[1];
-    return (m > gaussPixel[2] ? m : gaussPixel[2]) >= kHsvSaturation;
-}
+// `brightness`: the largest channel of the candidate's Gaussian pixel.
+inline bool IsHsvSaturated(int brightness) { return brightness >= kHsvSaturation; }
 
 // One pixel in place: B, G, R <-> H, S, V bytes (H 0..255 for the full circle).
 void RgbToHsv(unsigned char* pixel);

@@ -18,14 +18,31 @@ using holo4::MinChannel;
 
 namespace holo4 {
 
-void BuildCandidatePyramids(const CImage* const images[4], CPyramid laplacian[4], CPyramid gaussian[4]) {
+void BrightnessRow(const unsigned char* pixels, unsigned char* out, int begin, int end) {
+    for (int x = begin; x < end; ++x) out[x] = static_cast<unsigned char>(MaxChannel(pixels + 3 * x));
+}
+
+void BuildCandidatePyramids(const CImage* const images[4], CandidatePyramids& c) {
     // Distinct pyramids share nothing, so the four decompositions run side by side; each
-    // one's filters split their rows further.
+    // one's filters split their rows further. Of the Gaussian levels only the brightness
+    // (largest channel) of each pixel is needed, so it is kept instead of a copy of the
+    // levels; the Laplacian levels are the same bytes either way.
     imagelib::TaskGroup tasks;
     for (int i = 0; i < 4; ++i) {
-        tasks.Run([&, i] {
-            laplacian[i].Init(*images[i], kLevels);
-            laplacian[i].MakeLaplacian(&gaussian[i]);
+        tasks.Run([&c, &images, i] {
+            CPyramid& pyr = c.laplacian[i];
+            pyr.Init(*images[i], kLevels);
+            pyr.MakeGaussian();
+            for (int k = 0; k < kLevels; ++k) {
+                const CImage& level = pyr.GetLevel(k);
+                CImage& bright = c.brightness[i][k];
+                bright.Reallocate(level.GetWidth(), level.GetHeight(), 8);
+                ForEachRowBand(level.GetHeight(), [&](int begin, int end) {
+                    for (int y = begin; y < end; ++y)
+                        BrightnessRowFast(level.GetPtrXY(0, y), bright.GetPtrXY(0, y), level.GetWidth());
+                });
+            }
+            pyr.MakeLaplacian();
         });
     }
     tasks.Wait();
@@ -50,13 +67,12 @@ void DarkerOfFirstTwoRow(const unsigned char* const lap[4], unsigned char* out, 
     }
 }
 
-void ComposePixels(const unsigned char* const lap[4], const unsigned char* const gauss[4], unsigned char* out,
+void ComposePixels(const unsigned char* const lap[4], const unsigned char* const bright[4], unsigned char* out,
                    int begin, int end) {
     for (int x = begin; x < end; ++x) {
         const unsigned char* detail[4] = {lap[0] + 3 * x, lap[1] + 3 * x, lap[2] + 3 * x, lap[3] + 3 * x};
-        const int bright[4] = {MaxChannel(gauss[0] + 3 * x), MaxChannel(gauss[1] + 3 * x),
-                               MaxChannel(gauss[2] + 3 * x), MaxChannel(gauss[3] + 3 * x)};
-        ComposePixel(detail, bright, out + 3 * x);
+        const int brightness[4] = {bright[0][x], bright[1][x], bright[2][x], bright[3][x]};
+        ComposePixel(detail, brightness, out + 3 * x);
     }
 }
 
@@ -128,13 +144,13 @@ void ComposePixel(const unsigned char* const detail[4], const int bright[4], uns
 }
 
 // HologramsRemove4Img3: the flattest detail among candidates below 250; top if none.
-void FlattestUnsaturatedPixels(const unsigned char* const lap[4], const unsigned char* const gauss[4],
+void FlattestUnsaturatedPixels(const unsigned char* const lap[4], const unsigned char* const bright[4],
                                unsigned char* out, int begin, int end) {
     for (int x = begin; x < end; ++x) {
         int best = 1000, chosen = 0;
         for (int i = 0; i < 4; ++i) {
             const int peak = MaxChannel(lap[i] + 3 * x);
-            if (peak < best && MaxChannel(gauss[i] + 3 * x) < kBrightLimit3) {
+            if (peak < best && bright[i][x] < kBrightLimit3) {
                 best = peak;
                 chosen = i;
             }
@@ -149,19 +165,18 @@ namespace {
 
 // Runs `rowRule` over every row of level L of the result, with the candidates' rows.
 template <typename RowRule>
-void ComposeLevel(CPyramid& result, const CPyramid laplacian[4], const CPyramid gaussian[4], int level,
-                  RowRule rowRule) {
-    const int width = laplacian[0].GetLevel(level).GetWidth();
-    const int height = laplacian[0].GetLevel(level).GetHeight();
+void ComposeLevel(CPyramid& result, const holo4::CandidatePyramids& c, int level, RowRule rowRule) {
+    const int width = c.laplacian[0].GetLevel(level).GetWidth();
+    const int height = c.laplacian[0].GetLevel(level).GetHeight();
     holo4::ForEachRowBand(height, [&](int begin, int end) {
         for (int y = begin; y < end; ++y) {
             const unsigned char* lap[4];
-            const unsigned char* gauss[4];
+            const unsigned char* bright[4];
             for (int i = 0; i < 4; ++i) {
-                lap[i] = laplacian[i].GetLevel(level).GetPtrXY(0, y);
-                gauss[i] = gaussian[i].GetLevel(level).GetPtrXY(0, y);
+                lap[i] = c.laplacian[i].GetLevel(level).GetPtrXY(0, y);
+                bright[i] = c.brightness[i][level].GetPtrXY(0, y);
             }
-            rowRule(lap, gauss, result.GetLevel(level).GetPtrXY(0, y), width);
+            rowRule(lap, bright, result.GetLevel(level).GetPtrXY(0, y), width);
         }
     });
 }
@@ -176,17 +191,17 @@ void CHologramsRemove::HologramsRemove4Img(const CImage& top, const CImage& bott
     watch.Start();
     // Candidate order: top, bottom, right, left.
     const CImage* const candidates[4] = {&top, &bottom, &right, &left};
-    CPyramid laplacian[4], gaussian[4];
-    holo4::BuildCandidatePyramids(candidates, laplacian, gaussian);
+    holo4::CandidatePyramids pyramids;
+    holo4::BuildCandidatePyramids(candidates, pyramids);
     resultPyr.ForceType(CPyramid::PyrLaplacian);
     Trace(L"Pyramid creation time: %f\n", watch.ElapsedMicro() / 1000.0);
 
-    ComposeLevel(resultPyr, laplacian, gaussian, kLevels - 1,
+    ComposeLevel(resultPyr, pyramids, kLevels - 1,
                  [](const unsigned char* const lap[4], const unsigned char* const*, unsigned char* out, int width) {
                      holo4::DarkerOfFirstTwoRow(lap, out, width);
                  });
     for (int level = kLevels - 2; level >= 0; --level)
-        ComposeLevel(resultPyr, laplacian, gaussian, level, holo4::ComposeRowFast);
+        ComposeLevel(resultPyr, pyramids, level, holo4::ComposeRowFast);
     holo4::CollapseInto(resultPyr, result);
 }
 
@@ -194,13 +209,13 @@ void CHologramsRemove::HologramsRemove4Img3(const CImage& top, const CImage& bot
                                             const CImage& right, CImage& result) {
     if (!holo4::CheckFourInputs(top, bottom, left, right, L"HologramsRemove4Img3")) return;
     CPyramid resultPyr(kLevels, top.GetWidth(), top.GetHeight(), 3);
-    // Parameter order here. The Gaussian levels handed back by the Laplacian construction
-    // are the ones a separate Gaussian build would give, byte for byte.
+    // Parameter order here. The brightness kept from the Laplacian construction is that of
+    // a separately built Gaussian pyramid, byte for byte.
     const CImage* const candidates[4] = {&top, &bottom, &left, &right};
-    CPyramid laplacian[4], gaussian[4];
-    holo4::BuildCandidatePyramids(candidates, laplacian, gaussian);
+    holo4::CandidatePyramids pyramids;
+    holo4::BuildCandidatePyramids(candidates, pyramids);
     resultPyr.ForceType(CPyramid::PyrLaplacian);
     for (int level = kLevels - 1; level >= 0; --level)
-        ComposeLevel(resultPyr, laplacian, gaussian, level, holo4::FlattestUnsaturatedRowFast);
+        ComposeLevel(resultPyr, pyramids, level, holo4::FlattestUnsaturatedRowFast);
     holo4::CollapseInto(resultPyr, result);
 }

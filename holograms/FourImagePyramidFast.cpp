@@ -25,29 +25,39 @@ struct Candidates {
     V8 bright[4];  // largest Gaussian channel
 };
 
-Candidates Load(const D8 d, const unsigned char* const lap[4], const unsigned char* const gauss[4], int x) {
+Candidates Load(const D8 d, const unsigned char* const lap[4], const unsigned char* const bright[4], int x) {
     Candidates c;
     for (int i = 0; i < 4; ++i) {
         hn::LoadInterleaved3(d, lap[i] + 3 * x, c.b[i], c.g[i], c.r[i]);
         c.peak[i] = hn::Max(hn::Max(c.b[i], c.g[i]), c.r[i]);
-        V8 gb, gg, gr;
-        hn::LoadInterleaved3(d, gauss[i] + 3 * x, gb, gg, gr);
-        c.bright[i] = hn::Max(hn::Max(gb, gg), gr);
+        c.bright[i] = hn::LoadU(d, bright[i] + x);
     }
     return c;
+}
+
+void BrightnessRowVector(const unsigned char* pixels, unsigned char* out, int width) {
+    const D8 d;
+    const int lanes = static_cast<int>(hn::Lanes(d));
+    int x = 0;
+    for (; x + lanes <= width; x += lanes) {
+        V8 b, g, r;
+        hn::LoadInterleaved3(d, pixels + 3 * x, b, g, r);
+        hn::StoreU(hn::Max(hn::Max(b, g), r), d, out + x);
+    }
+    BrightnessRow(pixels, out, x, width);
 }
 
 // a >= threshold for unsigned bytes
 hn::Mask<D8> AtLeast(const D8 d, V8 a, uint8_t threshold) { return hn::Eq(hn::Max(a, hn::Set(d, threshold)), a); }
 
-void ComposeRowVector(const unsigned char* const lap[4], const unsigned char* const gauss[4], unsigned char* out,
+void ComposeRowVector(const unsigned char* const lap[4], const unsigned char* const bright[4], unsigned char* out,
                       int width) {
     const D8 d;
     const int lanes = static_cast<int>(hn::Lanes(d));
     uint8_t bits[HWY_MAX_BYTES / 8 + 8];
     int x = 0;
     for (; x + lanes <= width; x += lanes) {
-        const Candidates c = Load(d, lap, gauss, x);
+        const Candidates c = Load(d, lap, bright, x);
         auto anySaturated = AtLeast(d, c.bright[0], kSaturatedBrightness);
         for (int i = 1; i < 4; ++i) anySaturated = hn::Or(anySaturated, AtLeast(d, c.bright[i], kSaturatedBrightness));
         const V8 largest = hn::Max(hn::Max(c.peak[0], c.peak[1]), hn::Max(c.peak[2], c.peak[3]));
@@ -66,18 +76,18 @@ void ComposeRowVector(const unsigned char* const lap[4], const unsigned char* co
         if (hn::AllTrue(d, copyLargest)) continue;
         hn::StoreMaskBits(d, copyLargest, bits);
         for (int j = 0; j < lanes; ++j)
-            if (!(bits[j >> 3] & (1u << (j & 7)))) ComposePixels(lap, gauss, out, x + j, x + j + 1);
+            if (!(bits[j >> 3] & (1u << (j & 7)))) ComposePixels(lap, bright, out, x + j, x + j + 1);
     }
-    ComposePixels(lap, gauss, out, x, width);
+    ComposePixels(lap, bright, out, x, width);
 }
 
-void FlattestUnsaturatedRowVector(const unsigned char* const lap[4], const unsigned char* const gauss[4],
+void FlattestUnsaturatedRowVector(const unsigned char* const lap[4], const unsigned char* const bright[4],
                                   unsigned char* out, int width) {
     const D8 d;
     const int lanes = static_cast<int>(hn::Lanes(d));
     int x = 0;
     for (; x + lanes <= width; x += lanes) {
-        const Candidates c = Load(d, lap, gauss, x);
+        const Candidates c = Load(d, lap, bright, x);
         // The best value starts above every byte, so the first qualifying candidate always
         // takes it; later ones need a strictly smaller peak.
         auto found = hn::FirstN(d, 0);
@@ -94,7 +104,7 @@ void FlattestUnsaturatedRowVector(const unsigned char* const lap[4], const unsig
         }
         hn::StoreInterleaved3(b, g, r, d, out + 3 * x);
     }
-    FlattestUnsaturatedPixels(lap, gauss, out, x, width);
+    FlattestUnsaturatedPixels(lap, bright, out, x, width);
 }
 
 }  // namespace HWY_NAMESPACE
@@ -106,15 +116,20 @@ namespace holo4 {
 
 HWY_EXPORT(ComposeRowVector);
 HWY_EXPORT(FlattestUnsaturatedRowVector);
+HWY_EXPORT(BrightnessRowVector);
 
-void ComposeRowFast(const unsigned char* const lap[4], const unsigned char* const gauss[4], unsigned char* out,
-                    int width) {
-    HWY_DYNAMIC_DISPATCH(ComposeRowVector)(lap, gauss, out, width);
+void BrightnessRowFast(const unsigned char* pixels, unsigned char* out, int width) {
+    HWY_DYNAMIC_DISPATCH(BrightnessRowVector)(pixels, out, width);
 }
 
-void FlattestUnsaturatedRowFast(const unsigned char* const lap[4], const unsigned char* const gauss[4],
+void ComposeRowFast(const unsigned char* const lap[4], const unsigned char* const bright[4], unsigned char* out,
+                    int width) {
+    HWY_DYNAMIC_DISPATCH(ComposeRowVector)(lap, bright, out, width);
+}
+
+void FlattestUnsaturatedRowFast(const unsigned char* const lap[4], const unsigned char* const bright[4],
                                 unsigned char* out, int width) {
-    HWY_DYNAMIC_DISPATCH(FlattestUnsaturatedRowVector)(lap, gauss, out, width);
+    HWY_DYNAMIC_DISPATCH(FlattestUnsaturatedRowVector)(lap, bright, out, width);
 }
 
 }  // namespace holo4

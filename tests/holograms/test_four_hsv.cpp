@@ -43,9 +43,8 @@ TEST(FourImageHsv, ConversionOfGreyAndPrimaries) {
 }
 
 TEST(FourImageHsv, SaturationBoundAndThresholds) {
-    const unsigned char at246[3] = {0, 246, 0}, at245[3] = {245, 245, 245};
-    EXPECT_TRUE(holo4::IsHsvSaturated(at246));
-    EXPECT_FALSE(holo4::IsHsvSaturated(at245));
+    EXPECT_TRUE(holo4::IsHsvSaturated(246));
+    EXPECT_FALSE(holo4::IsHsvSaturated(245));
 
     uint32_t hist[256] = {};
     hist[10] = 5;

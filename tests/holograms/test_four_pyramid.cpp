@@ -94,12 +94,12 @@ TEST(FourImagePyramid, Variant3BrightnessBoundAndAllSaturatedTakesTop) {
     const unsigned char lap0[3] = {100, 100, 100}, lap1[3] = {90, 90, 90}, lap2[3] = {80, 80, 80},
                         lap3[3] = {70, 70, 70};
     const unsigned char* lap[4] = {lap0, lap1, lap2, lap3};
-    const unsigned char g249[3] = {249, 0, 0}, g250[3] = {0, 250, 0};
-    const unsigned char* gauss[4] = {g250, g250, g249, g250};
+    const unsigned char b249[1] = {249}, b250[1] = {250};
+    const unsigned char* bright[4] = {b250, b250, b249, b250};
     unsigned char out[3];
-    holo4::FlattestUnsaturatedPixels(lap, gauss, out, 0, 1);
+    holo4::FlattestUnsaturatedPixels(lap, bright, out, 0, 1);
     EXPECT_EQ(out[0], 80);
-    const unsigned char* allBright[4] = {g250, g250, g250, g250};
+    const unsigned char* allBright[4] = {b250, b250, b250, b250};
     holo4::FlattestUnsaturatedPixels(lap, allBright, out, 0, 1);
     EXPECT_EQ(out[0], 100);
 }
@@ -134,27 +134,29 @@ TEST(FourImagePyramid, GlareLargelyGoneOnAGeneratedCard) {
 TEST(FourImagePyramid, VectorRowRulesMatchThePlainOnes) {
     std::mt19937 rng(17);
     for (int width : {1, 15, 16, 31, 64, 97, 130}) {
-        std::vector<unsigned char> lapBytes[4], gaussBytes[4];
+        std::vector<unsigned char> lapBytes[4], brightBytes[4];
         const unsigned char* lap[4];
-        const unsigned char* gauss[4];
+        const unsigned char* bright[4];
         for (int i = 0; i < 4; ++i) {
             lapBytes[i].resize(3 * width);
-            gaussBytes[i].resize(3 * width);
-            for (int k = 0; k < 3 * width; ++k) {
-                // Mostly quiet detail near 128 (the vector case), sometimes strong detail;
-                // brightness around the 240 and 250 bounds.
-                lapBytes[i][k] = static_cast<unsigned char>(rng() % 8 ? 125 + rng() % 7 : rng() % 256);
-                gaussBytes[i][k] = static_cast<unsigned char>(rng() % 6 ? rng() % 240 : 236 + rng() % 20);
-            }
+            brightBytes[i].resize(width);
+            // Mostly quiet detail near 128 (the vector case), sometimes strong detail;
+            // brightness around the 240 and 250 bounds.
+            for (auto& b : lapBytes[i]) b = static_cast<unsigned char>(rng() % 8 ? 125 + rng() % 7 : rng() % 256);
+            for (auto& b : brightBytes[i]) b = static_cast<unsigned char>(rng() % 6 ? rng() % 240 : 236 + rng() % 20);
             lap[i] = lapBytes[i].data();
-            gauss[i] = gaussBytes[i].data();
+            bright[i] = brightBytes[i].data();
         }
         std::vector<unsigned char> plain(3 * width), fast(3 * width);
-        holo4::ComposePixels(lap, gauss, plain.data(), 0, width);
-        holo4::ComposeRowFast(lap, gauss, fast.data(), width);
+        holo4::ComposePixels(lap, bright, plain.data(), 0, width);
+        holo4::ComposeRowFast(lap, bright, fast.data(), width);
         EXPECT_EQ(plain, fast) << width;
-        holo4::FlattestUnsaturatedPixels(lap, gauss, plain.data(), 0, width);
-        holo4::FlattestUnsaturatedRowFast(lap, gauss, fast.data(), width);
+        holo4::FlattestUnsaturatedPixels(lap, bright, plain.data(), 0, width);
+        holo4::FlattestUnsaturatedRowFast(lap, bright, fast.data(), width);
         EXPECT_EQ(plain, fast) << width;
+        std::vector<unsigned char> plainBright(width), fastBright(width);
+        holo4::BrightnessRow(lap[0], plainBright.data(), 0, width);
+        holo4::BrightnessRowFast(lap[0], fastBright.data(), width);
+        EXPECT_EQ(plainBright, fastBright) << width;
     }
 }
