@@ -36,15 +36,16 @@ struct SSegmentGrades {
 
     RECT rect{};
     int pointCount = 0;
-    // A point lay so near the border that its search square was clipped: its grades were
-    // packed from entry 0 and no longer sit at their offsets, so the sums mean nothing.
+    // A point lay less than 12 pixels from the border, so its search square was clipped: its
+    // grades were packed from entry 0 and no longer sit at their offsets.
     bool clipped = false;
     std::array<float, kEntries> accumulated[2]{};  // [0]: plane 0, [1]: plane 2
 
     // The offset (dx, dy) of the lowest accumulated grade of `channel` (0 for plane 0,
     // 1 for plane 2): the channel's content sits that far from the reference's. Ties go to
     // the first entry in row-major order. None for a clipped segment, a segment without
-    // points, or a map without any contrast (all entries equal).
+    // points, or a map without any contrast (all entries equal). A flat window grades 0 like
+    // a perfect match, so on a noiseless picture flat paper can win over the true offset.
     std::optional<CPoint> BestOffset(int channel) const {
         if (clipped || pointCount == 0 || channel < 0 || channel > 1) return std::nullopt;
         const std::array<float, kEntries>& map = accumulated[channel];

@@ -98,7 +98,7 @@ void PrintGrades(const std::vector<SSegmentGrades>& grades, bool json) {
         } else {
             std::printf("segment %zu: box %d,%d-%d,%d points %d plane0 %s plane2 %s%s\n", i, r.left, r.top, r.right,
                         r.bottom, g.pointCount, OffsetText(g.BestOffset(0)).c_str(),
-                        OffsetText(g.BestOffset(1)).c_str(), g.clipped ? " (clipped at the border)" : "");
+                        OffsetText(g.BestOffset(1)).c_str(), g.clipped ? " (points at the border)" : "");
         }
     }
     if (json) std::printf("%s]}\n", grades.empty() ? "" : "\n");
@@ -114,7 +114,7 @@ void AddMatchChannelsCommand(CLI::App& app) {
         "match-channels",
         std::string("Find the dark strokes of plane 1 and report, per stroke segment, its box (inclusive), its "
                     "number of sampled points and the offset dx,dy at which plane 0 and plane 2 best match "
-                    "plane 1 (none when a point lies within 12 pixels of the border or nothing was graded). ") +
+                    "plane 1 (none when a point lies less than 12 pixels from the border, or nothing was graded). ") +
             kPlaneOrder);
     AddPlaneOptions(cmd, *args);
     cmd->add_option("--dump-dir", args->dumpDir, "Write the debug pictures (groups, maps) under this directory");
