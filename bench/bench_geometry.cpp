@@ -95,6 +95,32 @@ void BM_WarpRadialAndScale(benchmark::State& state) {
 }
 BENCHMARK(BM_WarpRadialAndScale)->Arg(1)->Arg(2)->Unit(benchmark::kMillisecond)->UseRealTime();
 
+// Single-threaded operations, for scale.
+void BM_DualCMOSFixAlongCurve(benchmark::State& state) {
+    const float seam[3] = {-2e-6f, 0.004f, 1200.0f};  // bulges 3 rows over the page width
+    CImage dst;
+    for (auto _ : state) {
+        DualCMOSFixAlongCurve(pageImage(), dst, 0.0f, 0.0f, seam, SPoint(0.0f, kPageWidth - 1.0f));
+        benchmark::DoNotOptimize(dst.GetBits());
+    }
+}
+BENCHMARK(BM_DualCMOSFixAlongCurve)->Unit(benchmark::kMillisecond)->UseRealTime();
+
+void BM_HillsVallysThreshold(benchmark::State& state) {
+    CImage grey(kPageWidth, kPageHeight, 8);
+    const CImage& page = pageImage();
+    for (int y = 0; y < kPageHeight; ++y)
+        for (int x = 0; x < kPageWidth; ++x) *grey.GetPtrXY(x, y) = page.GetPtrXY(x, y)[1];
+    for (auto _ : state) {
+        state.PauseTiming();
+        CImage img(grey);
+        state.ResumeTiming();
+        HillsVallysThreshold(img, 120);
+        benchmark::DoNotOptimize(img.GetBits());
+    }
+}
+BENCHMARK(BM_HillsVallysThreshold)->Unit(benchmark::kMillisecond)->UseRealTime();
+
 #ifdef VARNOTH_HAVE_OPENCV
 
 cv::Mat pageMat() {
