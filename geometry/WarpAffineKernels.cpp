@@ -1,7 +1,7 @@
 // WarpAffine's sampling: 16.16 bilinear with the 254 cap. sampleAffinePlain is the
 // definition. The fast path splits output rows among threads; within a row, groups of
 // pixels whose four source neighbours all lie inside src are sampled with Highway vectors
-// (gathered source words, the same integer weights), every other pixel by the scalar rule.
+// (the same integer weights on 32-bit lanes), every other pixel by the scalar rule.
 // Positions advance with wrapping 32-bit additions, so pixel i of row r sits at
 // start + r·rowStep + i·colStep (mod 2^32), the value the plain loop reaches by additions.
 #undef HWY_TARGET_INCLUDE
@@ -28,7 +28,7 @@ struct AffineSource {
     ptrdiff_t down = 0;             // bytes from row y to row y + 1 (negative: rows are bottom-up)
     int32_t span = 0;
     int32_t width = 0, height = 0;
-    bool vectorOffsets = false;  // every byte offset fits a 32-bit gather index
+    bool vectorOffsets = false;  // every byte offset of src fits a 32-bit lane
 };
 
 // One output row: `cols` pixels from 16.16 position (x, y), stepping by (stepX, stepY).
