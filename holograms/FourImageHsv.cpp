@@ -173,15 +173,14 @@ void FirstPass(const holo4::CandidatePyramids& c, int level, LevelPlanes& planes
                     lapRow[i] = c.laplacian[i].GetLevel(level).GetPtrXY(0, y);
                     brightRow[i] = c.brightness[i][level].GetPtrXY(0, y);
                 }
+                const size_t rowStart = static_cast<size_t>(y) * w;
+                for (int i = 0; i < 4; ++i) holo4::RgbToHsvRowFast(lapRow[i], &planes.hsv[i][3 * rowStart], w);
                 for (int x = 0; x < w; ++x) {
-                    const size_t at = static_cast<size_t>(y) * w + x;
+                    const size_t at = rowStart + x;
                     const unsigned char* hsv[4];
                     bool saturated[4];
                     for (int i = 0; i < 4; ++i) {
-                        unsigned char* p = &planes.hsv[i][3 * at];
-                        CopyPixel(p, lapRow[i] + 3 * x);
-                        holo4::RgbToHsv(p);
-                        hsv[i] = p;
+                        hsv[i] = &planes.hsv[i][3 * at];
                         saturated[i] = holo4::IsHsvSaturated(brightRow[i][x]);
                         planes.mask[i][at] = saturated[i] ? 1 : 0;
                     }

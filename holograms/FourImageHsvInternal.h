@@ -15,6 +15,9 @@ inline bool IsHsvSaturated(int brightness) { return brightness >= kHsvSaturation
 void RgbToHsv(unsigned char* pixel);
 void HsvToRgb(unsigned char* pixel);
 
+// RgbToHsv of n pixels from src into dst (3 bytes each), with vectors.
+void RgbToHsvRowFast(const unsigned char* src, unsigned char* dst, int n);
+
 // Largest s such that at least n pixels have a spread of s or more; 0 when n is 0 or the
 // sum reaches n only with bin 0.
 int SpreadThreshold(const uint32_t histogram[256], int64_t n);

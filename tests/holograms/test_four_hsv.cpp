@@ -1,5 +1,7 @@
 #include <gtest/gtest.h>
 
+#include <vector>
+
 #include "holograms/FourImageHsvInternal.h"
 #include "holograms/test_four_support.h"
 #include "scene/Scene.h"
@@ -101,4 +103,20 @@ TEST(FourImageHsv, RemovesGlareOnAGeneratedCard) {
     CImage result;
     remover.HologramsRemove4Img4(s.shots[0], s.shots[1], s.shots[2], s.shots[3], result);
     EXPECT_LT(scene::GlareShare(s, result), scene::GlareShare(s, s.shots[0]) / 4);
+}
+
+TEST(FourImageHsv, VectorConversionMatchesThePlainOne) {
+    // Every green and red value for a spread of blue values, in rows of odd length.
+    std::vector<unsigned char> rgb, plain, fast;
+    for (int b : {0, 1, 2, 63, 64, 127, 128, 129, 191, 200, 240, 245, 246, 250, 254, 255})
+        for (int g = 0; g < 256; ++g)
+            for (int r = 0; r < 256; ++r) rgb.insert(rgb.end(), {static_cast<unsigned char>(b),
+                                                                 static_cast<unsigned char>(g),
+                                                                 static_cast<unsigned char>(r)});
+    const int n = static_cast<int>(rgb.size() / 3) - 1;  // odd
+    plain.assign(rgb.begin(), rgb.begin() + 3 * n);
+    for (int i = 0; i < n; ++i) holo4::RgbToHsv(&plain[3 * i]);
+    fast.resize(3 * n);
+    holo4::RgbToHsvRowFast(rgb.data(), fast.data(), n);
+    EXPECT_EQ(plain, fast);
 }
