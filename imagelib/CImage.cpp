@@ -160,22 +160,48 @@ void CImage::Rotate(float angle, unsigned char fill, float) {
     }
 }
 
+namespace {
+
+// One pixel of `Bytes` bytes, copied as a value so the per-pixel copy compiles to plain moves.
+template <int Bytes>
+struct Pixel {
+    unsigned char b[Bytes];
+};
+
+// Quarter turns by destination rows: each destination row reads a source column (or a
+// reversed source row), so writes stay sequential.
+template <int Bytes>
+void TurnPixels(const CImage& src, CImage& dst, int count) {
+    using P = Pixel<Bytes>;
+    const int w = src.GetWidth(), h = src.GetHeight();
+    const int dw = dst.GetWidth(), dh = dst.GetHeight();
+    const ptrdiff_t srcSpan = src.GetSpan();
+    for (int ny = 0; ny < dh; ++ny) {
+        P* out = reinterpret_cast<P*>(dst.GetPtrXY(0, ny));
+        if (count == 2) {  // (x, y) -> (w-1-x, h-1-y)
+            const P* in = reinterpret_cast<const P*>(src.GetPtrXY(0, h - 1 - ny));
+            for (int nx = 0; nx < dw; ++nx) out[nx] = in[w - 1 - nx];
+        } else if (count == 1) {  // (x, y) -> (h-1-y, x): destination row ny is source column ny
+            // nx = h-1-y, so y runs from h-1 down to 0 as nx grows.
+            const unsigned char* in = src.GetPtrXY(ny, h - 1);
+            for (int nx = 0; nx < dw; ++nx, in += srcSpan) out[nx] = *reinterpret_cast<const P*>(in);
+        } else {  // (x, y) -> (y, w-1-x): destination row ny is source column w-1-ny
+            const unsigned char* in = src.GetPtrXY(w - 1 - ny, 0);
+            for (int nx = 0; nx < dw; ++nx, in -= srcSpan) out[nx] = *reinterpret_cast<const P*>(in);
+        }
+    }
+}
+
+}  // namespace
+
 void CImage::Rotate90ClockWise(int count) {
     count = ((count % 4) + 4) % 4;
     if (m_pixels == nullptr || count == 0) return;
     const CImage src(*this);
-    const int w = src.m_width, h = src.m_height, bpp = m_bits / 8;
-    if (count != 2) Reallocate(h, w, m_bits);
-    for (int y = 0; y < h; ++y) {
-        const unsigned char* in = src.GetPtrXY(0, y);
-        for (int x = 0; x < w; ++x, in += bpp) {
-            int nx = x, ny = y;
-            switch (count) {
-                case 1: nx = h - 1 - y; ny = x; break;          // clockwise
-                case 2: nx = w - 1 - x; ny = h - 1 - y; break;
-                case 3: nx = y; ny = w - 1 - x; break;          // counter-clockwise
-            }
-            std::memcpy(GetPtrXY(nx, ny), in, bpp);
-        }
+    if (count != 2) Reallocate(src.m_height, src.m_width, m_bits);
+    switch (m_bits) {
+        case 8: TurnPixels<1>(src, *this, count); break;
+        case 16: TurnPixels<2>(src, *this, count); break;
+        default: TurnPixels<3>(src, *this, count); break;
     }
 }
