@@ -26,7 +26,13 @@ CImage::CImage(CImage&& other) noexcept { *this = std::move(other); }
 
 CImage& CImage::operator=(const CImage& other) {
     if (this == &other) return *this;
-    Reallocate(other.m_width, other.m_height, other.m_bits);
+    // Same geometry: reuse the buffer instead of freeing and zero-filling a new one.
+    if (other.m_pixels == nullptr) {
+        Release();
+        m_bits = other.m_bits;
+    } else if (m_width != other.m_width || m_height != other.m_height || m_bits != other.m_bits || m_pixels == nullptr) {
+        Reallocate(other.m_width, other.m_height, other.m_bits);
+    }
     if (m_pixels != nullptr) std::memcpy(m_pixels, other.m_pixels, GetSize());
     if (other.m_palette != nullptr) {
         if (m_palette == nullptr) m_palette = new COLORREF[256];
