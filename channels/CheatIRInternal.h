@@ -19,6 +19,64 @@ constexpr uint8_t kNoEdge = 128;
 constexpr uint8_t kFallingPeak = 0;
 constexpr uint8_t kRisingPeak = 255;
 
+// The run-peak rule along one line of derivatives, walked in increasing position: when the
+// sign changes, the strongest position of the run that ended (the first of equal extremes)
+// becomes a falling or rising peak; the line's last run is never marked.
+struct RunPeakState {
+    enum : int32_t { kNone = 0, kFalling = 1, kRising = 2 };
+    int32_t state = kNone;
+    int32_t minimum = 0;  // of the current falling run
+    int32_t maximum = 0;  // of the current rising run
+    int32_t peak = 0;     // position of the current run's extreme
+};
+
+// One step of the rule for derivative d at position pos. Returns the edge value to write at
+// `marked` (the previous run's peak), or kNoEdge when no run ended.
+inline uint8_t StepRunPeak(RunPeakState& s, int16_t d, int32_t pos, int32_t& marked) {
+    uint8_t mark = kNoEdge;
+    if (d < 0) {
+        if (s.state == RunPeakState::kRising) {
+            mark = kRisingPeak;
+            marked = s.peak;
+            s.maximum = 0;
+        }
+        s.state = RunPeakState::kFalling;
+        if (d < s.minimum) {
+            s.minimum = d;
+            s.peak = pos;
+        }
+    } else if (d > 0) {
+        if (s.state == RunPeakState::kFalling) {
+            mark = kFallingPeak;
+            marked = s.peak;
+            s.minimum = 0;
+        }
+        s.state = RunPeakState::kRising;
+        if (d > s.maximum) {
+            s.maximum = d;
+            s.peak = pos;
+        }
+    }
+    return mark;
+}
+
+// The column pass walks all columns side by side, a row at a time: one state per column,
+// kept as arrays so the fast version loads a vector of columns at once.
+struct ColumnPeakStates {
+    std::vector<int32_t> state, minimum, maximum, peak;
+    explicit ColumnPeakStates(int width)
+        : state(Size(width)), minimum(Size(width)), maximum(Size(width)), peak(Size(width)) {}
+
+private:
+    static size_t Size(int width) { return static_cast<size_t>(width > 0 ? width : 0); }
+};
+
+// Steps the columns [begin, end) with row y's derivatives d; a mark for column x at row r
+// goes to edgeRows[r][x]. The plain version is the definition.
+void StepColumnPeaksPlain(ColumnPeakStates& states, const int16_t* d, int begin, int end, int32_t y,
+                          uint8_t* const* edgeRows);
+void StepColumnPeaksFast(ColumnPeakStates& states, const int16_t* d, int width, int32_t y, uint8_t* const* edgeRows);
+
 // True when `planes` points at three 8-bit planes of one width and height. `caller` names
 // the operation in the trace line written when they do not.
 bool PlanesUsable(const CImage* planes, const char* caller);

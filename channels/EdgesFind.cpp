@@ -23,49 +23,6 @@ constexpr int kAboveReach = 2;
 // A label value handed out must stay below the unlabelled value.
 constexpr int kLabelLimit = kUnlabelled;
 
-// Walks one line of derivatives and reports, when the sign changes, the strongest position
-// of the run that ended (the first of equal extremes); the line's last run is never reported.
-class RunPeakMarker {
-public:
-    // The position to mark with `Mark()` as a falling or rising peak, or -1.
-    int Step(int16_t d, int pos) {
-        int marked = -1;
-        if (d < 0) {
-            if (m_state == State::Rising) {
-                marked = m_peak;
-                m_mark = kRisingPeak;
-                m_max = 0;
-            }
-            m_state = State::Falling;
-            if (d < m_min) {
-                m_min = d;
-                m_peak = pos;
-            }
-        } else if (d > 0) {
-            if (m_state == State::Falling) {
-                marked = m_peak;
-                m_mark = kFallingPeak;
-                m_min = 0;
-            }
-            m_state = State::Rising;
-            if (d > m_max) {
-                m_max = d;
-                m_peak = pos;
-            }
-        }
-        return marked;
-    }
-    uint8_t Mark() const { return m_mark; }
-
-private:
-    enum class State : uint8_t { None, Falling, Rising };
-    State m_state = State::None;
-    uint8_t m_mark = kNoEdge;
-    int16_t m_min = 0;
-    int16_t m_max = 0;
-    int m_peak = 0;
-};
-
 // Five-tap derivative: positive where brightness increases along the line.
 inline int16_t Derivative(int minus2, int minus1, int plus1, int plus2) {
     return static_cast<int16_t>(2 * (plus2 - minus2) + plus1 - minus1);
@@ -133,10 +90,11 @@ void CCheatIR::EdgesFind(CImage& derivRows, CImage& derivCols, CImage& edgesRows
         uint8_t* e = edgesRows.GetPtrXY(0, y);
         for (int x = 2; x <= width - 3; ++x) d[x] = Derivative(p[x - 2], p[x - 1], p[x + 1], p[x + 2]);
         rowCounts.Count(d, 2, width - 2);
-        RunPeakMarker marker;
+        channels::RunPeakState state;
+        int32_t peak = 0;
         for (int x = 2; x <= width - 3; ++x) {
-            const int peak = marker.Step(d[x], x);
-            if (peak >= 0) e[peak] = marker.Mark();
+            const uint8_t mark = channels::StepRunPeak(state, d[x], x, peak);
+            if (mark != kNoEdge) e[peak] = mark;
         }
     }
     rowCounts.MergeInto(histogram);
@@ -145,7 +103,9 @@ void CCheatIR::EdgesFind(CImage& derivRows, CImage& derivCols, CImage& edgesRows
     // Every column keeps its own marker, so the columns are walked side by side, a row at a
     // time, each with increasing y.
     MagnitudeCounter columnCounts;
-    std::vector<RunPeakMarker> markers(static_cast<size_t>(width > 0 ? width : 0));
+    channels::ColumnPeakStates states(width);
+    std::vector<uint8_t*> edgeRows(static_cast<size_t>(height > 0 ? height : 0));
+    for (int y = 0; y < height; ++y) edgeRows[y] = edgesCols.GetPtrXY(0, y);
     for (int y = 2; y <= height - 3; ++y) {
         const uint8_t* up2 = source.GetPtrXY(0, y - 2);
         const uint8_t* up1 = source.GetPtrXY(0, y - 1);
@@ -154,10 +114,7 @@ void CCheatIR::EdgesFind(CImage& derivRows, CImage& derivCols, CImage& edgesRows
         int16_t* d = channels::Row16(derivCols, y);
         for (int x = 0; x < width; ++x) d[x] = Derivative(up2[x], up1[x], down1[x], down2[x]);
         columnCounts.Count(d, 0, width);
-        for (int x = 0; x < width; ++x) {
-            const int peak = markers[x].Step(d[x], y);
-            if (peak >= 0) edgesCols.GetPtrXY(0, peak)[x] = markers[x].Mark();
-        }
+        channels::StepColumnPeaksFast(states, d, width, y, edgeRows.data());
     }
     columnCounts.MergeInto(histogram);
     const int columnThreshold = ThresholdFromHistogram(histogram);

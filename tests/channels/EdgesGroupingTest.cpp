@@ -1,6 +1,9 @@
 #include <gtest/gtest.h>
 
+#include <random>
 #include <vector>
+
+#include <hwy/targets.h>
 
 #include "channels/CheatIRTestAccess.h"
 
@@ -56,6 +59,35 @@ TEST(EdgesFind, StepEdgeHasNoPeakAndDerivativesRiseWithBrightness) {
     EXPECT_EQ(Deriv(e.dc, 3, 6), 320);
     EXPECT_EQ(Deriv(e.dc, 3, 14), 0);
     EXPECT_EQ(Deriv(e.dr, 1, 3), 0);  // outside the computed columns
+}
+
+TEST(EdgesFind, FastColumnPeaksEqualThePlainRule) {
+    for (int64_t target : hwy::SupportedAndGeneratedTargets()) {
+        hwy::SetSupportedTargetsForTest(target);
+        for (int width : {1, 7, 33, 70}) {
+            const int height = 60;
+            CImage plain(width, height, 8), fast(width, height, 8);
+            plain.Set(128);
+            fast.Set(128);
+            std::vector<uint8_t*> plainRows, fastRows;
+            for (int y = 0; y < height; ++y) {
+                plainRows.push_back(plain.GetPtrXY(0, y));
+                fastRows.push_back(fast.GetPtrXY(0, y));
+            }
+            channels::ColumnPeakStates plainStates(width), fastStates(width);
+            std::mt19937 random(static_cast<unsigned>(width));
+            std::vector<int16_t> d(static_cast<size_t>(width));
+            for (int y = 0; y < height; ++y) {
+                for (int16_t& v : d) v = static_cast<int16_t>(random() % 3 == 0 ? 0 : int(random() % 41) - 20);
+                channels::StepColumnPeaksPlain(plainStates, d.data(), 0, width, y, plainRows.data());
+                channels::StepColumnPeaksFast(fastStates, d.data(), width, y, fastRows.data());
+            }
+            EXPECT_TRUE(SamePixels(plain, fast)) << hwy::TargetName(target) << " width " << width;
+            EXPECT_EQ(plainStates.peak, fastStates.peak);
+            EXPECT_EQ(plainStates.minimum, fastStates.minimum);
+        }
+    }
+    hwy::SetSupportedTargetsForTest(0);
 }
 
 TEST(InitialGrouping, NarrowBarGetsOneLabelOnEveryRow) {
