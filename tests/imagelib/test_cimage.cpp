@@ -44,7 +44,8 @@ TEST(CImage, CopiesAreDeepAndMovesTransferThePixels) {
     EXPECT_EQ(d.GetBits(), pixels);
     EXPECT_TRUE(b.IsEmpty());
     EXPECT_TRUE(SamePixels(c, d));
-    d = CImage();  // assigning an empty image empties the target
+    const CImage empty;
+    d = empty;  // assigning an empty image empties the target
     EXPECT_TRUE(d.IsEmpty());
     EXPECT_EQ(d.GetWidth(), 0);
 }
