@@ -92,7 +92,6 @@ void CHologramsRemove::ExpandHologramsBolbsN(CImage& mask, int border, int itera
         }
     }
 
-    static constexpr int kFour[4][2] = {{-1, 0}, {1, 0}, {0, -1}, {0, 1}};  // left, right, upper, lower
     for (int pass = 0; pass < iterations; ++pass) {
         const CImage before(mask);
         for (int y = border; y < height - border; ++y) {
@@ -101,7 +100,7 @@ void CHologramsRemove::ExpandHologramsBolbsN(CImage& mask, int border, int itera
                 if (Row(before, y)[3 * x] != 0) continue;
                 int sums[3] = {0, 0, 0};
                 int marked = 0;
-                for (const auto& step : kFour) {
+                for (const auto& step : holo::kFourNeighbours) {
                     const int nx = x + step[0];
                     const int ny = y + step[1];
                     if (nx < 0 || ny < 0 || nx >= width || ny >= height) continue;

@@ -69,8 +69,7 @@ bool OnRim(const PixelGrid& mask, int x, int y) {
         if (mask.Inside(nx, ny) && *mask.At(nx, ny) > 200) ++glare;
     }
     if (glare >= 8) return false;
-    static constexpr int kFour[4][2] = {{-1, 0}, {1, 0}, {0, -1}, {0, 1}};
-    for (const auto& step : kFour) {
+    for (const auto& step : kFourNeighbours) {
         const int nx = x + step[0], ny = y + step[1];
         if (!mask.Inside(nx, ny) || *mask.At(nx, ny) < 128) return true;
     }

@@ -72,6 +72,9 @@ struct PixelGrid {
     bool Inside(int x, int y) const { return x >= 0 && y >= 0 && x < width && y < height; }
 };
 
+// Left, right, upper and lower neighbour, as (dx, dy).
+inline constexpr int kFourNeighbours[4][2] = {{-1, 0}, {1, 0}, {0, -1}, {0, 1}};
+
 // The neighbour order of the blob flood fills, as (dx, dy).
 inline constexpr int kFloodOrder[8][2] = {{0, 1}, {1, 1}, {1, 0}, {1, -1}, {0, -1}, {-1, -1}, {-1, 0}, {-1, 1}};
 
