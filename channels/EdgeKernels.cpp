@@ -6,6 +6,8 @@
 #include <hwy/foreach_target.h>  // IWYU pragma: keep
 #include <hwy/highway.h>
 
+#include <cstdint>
+
 #include "channels/CheatIRInternal.h"
 
 HWY_BEFORE_NAMESPACE();
@@ -37,11 +39,20 @@ int StepColumnPeaksLanes(ColumnPeakStates& states, const int16_t* d, int width, 
         const auto positive = hn::Gt(dv, zero);
         const auto endsRising = hn::And(negative, hn::Eq(st, rising));
         const auto endsFalling = hn::And(positive, hn::Eq(st, falling));
-        if (!hn::AllFalse(di, hn::Or(endsRising, endsFalling))) {
-            for (int lane = 0; lane < lanes; ++lane) {
-                const int32_t s = state[x + lane], v = d[x + lane];
-                if (v < 0 && s == RunPeakState::kRising) edgeRows[peak[x + lane]][x + lane] = kRisingPeak;
-                if (v > 0 && s == RunPeakState::kFalling) edgeRows[peak[x + lane]][x + lane] = kFallingPeak;
+        const auto ends = hn::Or(endsRising, endsFalling);
+        if (!hn::AllFalse(di, ends)) {
+            uint8_t endBits[8] = {}, risingBits[8] = {};
+            hn::StoreMaskBits(di, ends, endBits);
+            hn::StoreMaskBits(di, endsRising, risingBits);
+            uint64_t endMask = 0, risingMask = 0;
+            for (int i = 0; i < 8; ++i) {
+                endMask |= static_cast<uint64_t>(endBits[i]) << (8 * i);
+                risingMask |= static_cast<uint64_t>(risingBits[i]) << (8 * i);
+            }
+            for (; endMask != 0; endMask &= endMask - 1) {
+                const int lane = static_cast<int>(hwy::Num0BitsBelowLS1Bit_Nonzero64(endMask));
+                const bool risingEnd = (risingMask >> lane) & 1;
+                edgeRows[peak[x + lane]][x + lane] = risingEnd ? kRisingPeak : kFallingPeak;
             }
         }
         mx = hn::IfThenZeroElse(endsRising, mx);
