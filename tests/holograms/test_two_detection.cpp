@@ -122,6 +122,24 @@ TEST(TwoDetection, SaturatedPixelsJoinTheMaskOfTheOnlySaturatedShot) {
     EXPECT_EQ(Px(m1, 4, 0), (std::vector<int>{0, 0, 0}));
 }
 
+// Image 1 is brighter on its left half; one pixel there stands 40 above its own average.
+TEST(TwoDetection, AverageBasedDetectorMarksWhereImageOneIsBrighterThanItsAverage) {
+    CHologramsRemove remover;
+    CImage i1 = Solid24(20, 20, 100, 100, 100), i2 = i1, a2 = i1, map1, map2, diff;
+    for (int y = 0; y < 20; ++y)
+        for (int x = 0; x < 10; ++x) Put24(i1, x, y, 150, 150, 150);
+    CImage a1 = i1;
+    Put24(i1, 5, 10, 190, 190, 190);
+    int count1 = -1, count2 = -1;
+    remover.FindHologramsPixels_24_New_Alg2(i1, a1, i2, a2, map1, map2, diff, 3, 0, 0, count1, count2);
+    // The masked average there: (150 * 9 - 190 + 4) / 8 = 145, so the excess is 45.
+    EXPECT_EQ(Px(a1, 5, 10), (std::vector<int>{145, 145, 145}));
+    EXPECT_EQ(Px(map1, 5, 10), (std::vector<int>{45, 45, 45}));
+    EXPECT_EQ(count1, 3);  // one per channel
+    EXPECT_EQ(count2, 0);
+    EXPECT_EQ(CountMarked(map1), 1);
+}
+
 TEST(TwoDetection, AverageBasedDetectorFindsNothingOnIdenticalShots) {
     CHologramsRemove remover;
     CImage image = RandomImage(40, 30, 24, 9, 60, 200), average, image2 = image, average2, map1, map2, diff;
