@@ -179,6 +179,8 @@ void MergeOverlappingBoxes(CSafeArray<RECT>& boxes) {
             merged = false;
             for (size_t b = a + 1; b < used.size(); ++b) {
                 RECT& other = boxes[used[b]];
+                // Boxes apart along x cannot overlap; IntersectRect decides for the rest.
+                if (other.left >= box.right || box.left >= other.right) continue;
                 RECT overlap;
                 if (!IntersectRect(&overlap, &box, &other)) continue;
                 UnionRect(&box, &box, &other);
