@@ -8,11 +8,13 @@
 // Small helpers shared by the test programs.
 namespace testing_images {
 
-// An image of the given geometry filled with random bytes, row padding included.
-inline CImage RandomImage(int w, int h, int bits, uint32_t seed) {
+// An image of the given geometry whose every byte, row padding included, is random in
+// low..high.
+inline CImage RandomImage(int w, int h, int bits, uint32_t seed, int low = 0, int high = 255) {
     CImage img(w, h, bits);
     std::mt19937 rng(seed);
-    for (size_t i = 0; i < img.GetSize(); ++i) img.GetBits()[i] = static_cast<unsigned char>(rng());
+    std::uniform_int_distribution<int> value(low, high);
+    for (size_t i = 0; i < img.GetSize(); ++i) img.GetBits()[i] = static_cast<unsigned char>(value(rng));
     return img;
 }
 

@@ -8,6 +8,7 @@
 #include <string>
 #include <vector>
 
+#include "common/TestImages.h"
 #include "imagelib/CImage.h"
 #include "imagelib/Trace.h"
 
@@ -28,14 +29,7 @@ inline CImage noiseImage(int width, int height, int bits, uint32_t seed = 1, int
 }
 
 // Same size, depth and pixel bytes (row padding ignored).
-inline bool samePixels(const CImage& a, const CImage& b) {
-    if (a.GetWidth() != b.GetWidth() || a.GetHeight() != b.GetHeight() || a.GetBitCount() != b.GetBitCount())
-        return false;
-    const size_t rowBytes = static_cast<size_t>(a.GetWidth()) * (a.GetBitCount() / 8);
-    for (int y = 0; y < a.GetHeight(); ++y)
-        if (std::memcmp(a.GetPtrXY(0, y), b.GetPtrXY(0, y), rowBytes) != 0) return false;
-    return true;
-}
+inline bool samePixels(const CImage& a, const CImage& b) { return testing_images::SamePixels(a, b); }
 
 // Runs `body` once with each vector target this machine supports forced, then restores the
 // normal choice, so the dispatched kernels are checked on every instruction set they use here.

@@ -3,18 +3,12 @@
 #include <cstdint>
 #include <random>
 
+#include "common/TestImages.h"
 #include "imagelib/CImage.h"
 
 namespace pyramid_test {
 
-// Every byte of the buffer random, row padding included.
-inline CImage RandomImage(int width, int height, int bits, uint32_t seed, int low = 0, int high = 255) {
-    CImage image(width, height, bits);
-    std::mt19937 rng(seed);
-    std::uniform_int_distribution<int> value(low, high);
-    for (size_t i = 0; i < image.GetSize(); ++i) image.GetBits()[i] = static_cast<uint8_t>(value(rng));
-    return image;
-}
+using testing_images::RandomImage;
 
 // Sets the bytes of image row y (GetPtrXY order) to `values`, repeated for every channel.
 inline void FillRowPixels(CImage& image, int y, std::initializer_list<int> values) {
