@@ -1,4 +1,5 @@
 // warp affine, warp radial, seam, hills: geometric correction and the three-level threshold.
+#include <algorithm>
 #include <cfloat>
 #include <cmath>
 #include <cstdio>
@@ -13,7 +14,34 @@
 
 namespace {
 
-constexpr int kMaxSide = 65535;  // largest output side the tool will allocate
+constexpr int kMaxSide = 65535;       // largest output side the tool will allocate
+constexpr double kMaxPixels = 1 << 28;  // largest output area (768 MB in colour)
+
+void RequireOutputSize(double width, double height, const std::string& what) {
+    if (width <= kMaxSide && height <= kMaxSide && width * height <= kMaxPixels) return;
+    char text[128];
+    std::snprintf(text, sizeof text, ": the output would be about %.6g x %.6g pixels (at most %d a side, %.0f in all)",
+                  width, height, kMaxSide, kMaxPixels);
+    throw ToolError(what + text);
+}
+
+// The size --fit gives the output: the box around the source corners mapped back through m.
+// Checked before WarpAffine allocates it; a singular map is left to WarpAffine to refuse.
+void RequireFittedSize(const std::vector<float>& m, const CImage& src) {
+    const double det = static_cast<double>(m[0]) * m[4] - static_cast<double>(m[1]) * m[3];
+    if (det == 0.0) return;
+    const double i00 = m[4] / det, i01 = -m[1] / det, i10 = -m[3] / det, i11 = m[0] / det;
+    const double xs[4] = {0.0, src.GetWidth() - 1.0, src.GetWidth() - 1.0, 0.0};
+    const double ys[4] = {0.0, 0.0, src.GetHeight() - 1.0, src.GetHeight() - 1.0};
+    double lowX = HUGE_VAL, highX = -HUGE_VAL, lowY = HUGE_VAL, highY = -HUGE_VAL;
+    for (int k = 0; k < 4; ++k) {
+        const double x = i00 * (xs[k] - m[2]) + i01 * (ys[k] - m[5]);
+        const double y = i10 * (xs[k] - m[2]) + i11 * (ys[k] - m[5]);
+        lowX = std::min(lowX, x), highX = std::max(highX, x);
+        lowY = std::min(lowY, y), highY = std::max(highY, y);
+    }
+    RequireOutputSize(highX - lowX + 1.0, highY - lowY + 1.0, "--matrix with --fit");
+}
 
 // `count` numbers that fit a float.
 std::vector<float> ParseFloats(const std::string& text, size_t count, const std::string& what) {
@@ -60,10 +88,11 @@ void AddWarpAffineCommand(CLI::App& warp) {
             shift = SPoint(xy[0], xy[1]);
         }
         const CImage src = LoadImage(args->in);
+        if (args->fit) RequireFittedSize(m, src);
         CImage dst(src.GetWidth(), src.GetHeight(), src.GetBitCount());
         CPoint corners[4];
         if (!WarpAffine(m.data(), src, dst, args->fit, args->shift.empty() ? nullptr : &shift, corners))
-            throw ToolError("the map cannot be applied (singular with --fit, or the output window is empty)");
+            throw ToolError("--matrix: the map cannot be applied (singular with --fit, or the output window is empty)");
         if (args->fit && dst.GetWidth() > 0) {
             std::printf("output %d x %d\n", dst.GetWidth(), dst.GetHeight());
             const char* names[4] = {"top-left", "top-right", "bottom-right", "bottom-left"};
@@ -103,6 +132,7 @@ void AddWarpRadialCommand(CLI::App& warp) {
                 if (v != std::floor(v) || v < 1 || v > kMaxSide)
                     throw ToolError("--scale: '" + args->scale + "' must be two whole sizes from 1 to " +
                                     std::to_string(kMaxSide));
+            RequireOutputSize(size[0], size[1], "--scale");
             dst.Reallocate(static_cast<int>(size[0]), static_cast<int>(size[1]), src.GetBitCount(), 0);
             if (!WarpRadialAndScale(p, src, dst)) throw ToolError(args->in + ": the image cannot be warped");
         }
