@@ -1,4 +1,5 @@
 // fuse, stitch: multi-image fusion through Laplacian pyramids.
+#include <cmath>
 #include <string>
 
 #include "pyramid/Fusion.h"
@@ -8,6 +9,8 @@
 namespace {
 
 constexpr int kMaxLevels = 30;
+// Placements beyond any image; keeps the fusion's offset arithmetic far from int overflow.
+constexpr double kMaxOffset = 1e6;
 
 void RequireLevels(int levels) {
     if (levels < 1 || levels > kMaxLevels)
@@ -86,6 +89,9 @@ void AddStitchCommand(CLI::App& app) {
     cmd->callback([args] {
         RequireLevels(args->levels);
         const std::vector<double> offsets = ParseNumberList(args->offsets, 8, "--offsets");
+        for (double v : offsets)
+            if (!(std::fabs(v) <= kMaxOffset) || v != std::floor(v))
+                throw ToolError("--offsets: '" + args->offsets + "' must hold whole numbers from -1000000 to 1000000");
         // The fusion's slots: 0 lower right, 1 upper right, 2 lower left, 3 upper left.
         const std::string* paths[4] = {&args->bottomRight, &args->topRight, &args->bottomLeft, &args->topLeft};
         const int order[4] = {3, 1, 2, 0};  // the slot's position on the command line
