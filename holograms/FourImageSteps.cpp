@@ -81,6 +81,23 @@ void DecideStepPixel(StepPixel& st, const unsigned char* const detail[4], unsign
     }
 }
 
+void FoldPixels(uint8_t* const map[9], int step, const unsigned char* bright, const unsigned char* detail, int begin,
+                int end) {
+    for (int x = begin; x < end; ++x) {
+        StepPixel st{map[0][x], map[1][x], map[2][x], map[3][x], map[4][x], map[5][x], map[6][x], map[7][x], map[8][x]};
+        FoldCandidate(st, step, MaxChannel(bright + 3 * x), MaxChannel(detail + 3 * x));
+    }
+}
+
+void DecidePixels(uint8_t* const map[9], const unsigned char* const detail[4], unsigned char* out, int begin,
+                  int end) {
+    for (int x = begin; x < end; ++x) {
+        StepPixel st{map[0][x], map[1][x], map[2][x], map[3][x], map[4][x], map[5][x], map[6][x], map[7][x], map[8][x]};
+        const unsigned char* at[4] = {detail[0] + 3 * x, detail[1] + 3 * x, detail[2] + 3 * x, detail[3] + 3 * x};
+        DecideStepPixel(st, at, out + 3 * x);
+    }
+}
+
 }  // namespace holo4
 
 namespace {
@@ -146,17 +163,9 @@ void FoldLevel(const StateMaps& maps, const CPyramid inputs[4], const CPyramid& 
             const unsigned char* detailRow[4] = {nullptr, nullptr, nullptr, nullptr};
             for (int i = 0; i < 4; ++i)
                 if (i == step || step == 3) detailRow[i] = inputs[i].GetLevel(level).GetPtrXY(0, y);
-            unsigned char* out = result.GetLevel(level).GetPtrXY(0, y);
-            for (int x = 0; x < width; ++x) {
-                holo4::StepPixel st{row[0][x], row[1][x], row[2][x], row[3][x], row[4][x],
-                                    row[5][x], row[6][x], row[7][x], row[8][x]};
-                holo4::FoldCandidate(st, step, MaxChannel(bright + 3 * x), MaxChannel(detailRow[step] + 3 * x));
-                if (step == 3) {
-                    const unsigned char* detail[4] = {detailRow[0] + 3 * x, detailRow[1] + 3 * x,
-                                                      detailRow[2] + 3 * x, detailRow[3] + 3 * x};
-                    holo4::DecideStepPixel(st, detail, out + 3 * x);
-                }
-            }
+            // Every pixel is independent: the whole row is folded, then (step 3) decided.
+            holo4::FoldRowFast(row, step, bright, detailRow[step], width);
+            if (step == 3) holo4::DecideRowFast(row, detailRow, result.GetLevel(level).GetPtrXY(0, y), width);
         }
     });
 }

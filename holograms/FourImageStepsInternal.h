@@ -26,4 +26,15 @@ void FoldCandidate(StepPixel& st, int step, int g, int p);
 // pixels; may exchange the two brightness indexes, as the rule reads them.
 void DecideStepPixel(StepPixel& st, const unsigned char* const detail[4], unsigned char* out);
 
+// Whole rows. `map` holds the nine state-map rows in StepPixel order; `bright` and the
+// detail rows are 24-bit (brightness and peak are their largest channels). The plain forms
+// take the pixels [begin, end) and define the bytes; the fast forms use vectors.
+void FoldPixels(uint8_t* const map[9], int step, const unsigned char* bright, const unsigned char* detail, int begin,
+                int end);
+void FoldRowFast(uint8_t* const map[9], int step, const unsigned char* bright, const unsigned char* detail,
+                 int width);
+void DecidePixels(uint8_t* const map[9], const unsigned char* const detail[4], unsigned char* out, int begin,
+                  int end);
+void DecideRowFast(uint8_t* const map[9], const unsigned char* const detail[4], unsigned char* out, int width);
+
 }  // namespace holo4

@@ -1,5 +1,8 @@
 #include <gtest/gtest.h>
 
+#include <random>
+#include <vector>
+
 #include "common/TestImages.h"
 #include "holograms/FourImageStepsInternal.h"
 #include "holograms/test_four_support.h"
@@ -136,4 +139,40 @@ TEST(FourImageSteps, OutOfOrderAndMismatchedStepsAreIgnored) {
     const CImage first = result;
     r.HologramsRemove4ImgInSteps(a, 3, result);  // repeated: the same image again
     EXPECT_TRUE(SamePixels(result, first));
+}
+
+TEST(FourImageSteps, VectorRowsMatchThePlainOnes) {
+    std::mt19937 rng(23);
+    auto byte = [&](int lo, int hi) { return static_cast<unsigned char>(lo + static_cast<int>(rng() % (hi - lo + 1))); };
+    for (int width : {1, 17, 64, 99, 200}) {
+        std::vector<unsigned char> rows[4], bright(3 * width);
+        const unsigned char* detail[4];
+        for (int i = 0; i < 4; ++i) {
+            rows[i].resize(3 * width);
+            for (auto& b : rows[i]) b = rng() % 6 ? byte(124, 131) : byte(0, 255);  // mostly quiet detail
+            detail[i] = rows[i].data();
+        }
+        std::vector<uint8_t> plainMaps(9 * width), fastMaps;
+        for (int x = 0; x < width; ++x) {  // the reset of step 0
+            plainMaps[1 * width + x] = plainMaps[3 * width + x] = plainMaps[7 * width + x] = 255;
+        }
+        fastMaps = plainMaps;
+        uint8_t* plainRows[9];
+        uint8_t* fastRows[9];
+        for (int m = 0; m < 9; ++m) {
+            plainRows[m] = &plainMaps[m * width];
+            fastRows[m] = &fastMaps[m * width];
+        }
+        for (int step = 0; step < 4; ++step) {
+            for (auto& b : bright) b = rng() % 5 ? byte(0, 239) : byte(238, 255);
+            holo4::FoldPixels(plainRows, step, bright.data(), detail[step], 0, width);
+            holo4::FoldRowFast(fastRows, step, bright.data(), detail[step], width);
+            ASSERT_EQ(plainMaps, fastMaps) << width << " step " << step;
+        }
+        std::vector<unsigned char> plainOut(3 * width), fastOut(3 * width);
+        holo4::DecidePixels(plainRows, detail, plainOut.data(), 0, width);
+        holo4::DecideRowFast(fastRows, detail, fastOut.data(), width);
+        EXPECT_EQ(plainOut, fastOut) << width;
+        EXPECT_EQ(plainMaps, fastMaps) << width;
+    }
 }
