@@ -236,8 +236,10 @@ float CHologramsRemove::CalcVectSlope(int* vector, int first, int last, int step
 }
 
 void CHologramsRemove::CalcAvRGBVect(int* profile, int n, int window) {
-    if ((profile == nullptr || window < 1 || n < window + 15) &&
-        Refuse(L"CalcAvRGBVect", "needs a vector of at least window + 15 elements and a window of at least 1"))
+    // Each slope reads 15 averages; the averages fill elements h ... n - 1 - W + h, so n must be
+    // at least 2h + 16: window + 15 for an odd window, one more for an even one.
+    if ((profile == nullptr || window < 1 || n < 2 * (window / 2) + 16) &&
+        Refuse(L"CalcAvRGBVect", "needs a window of at least 1 and 15 averages for each end slope"))
         return;
     const int half = window / 2;
     const size_t count = static_cast<size_t>(n) * 3;
@@ -263,17 +265,19 @@ void CHologramsRemove::CalcAvRGBVect(int* profile, int n, int window) {
     }
 
     // Linear extension of the smoothed curve to both ends, never below 0.
+    const int endElement = n - 2 - half;
     for (int c = 0; c < 3; ++c) {
         const float startSlope = CalcVectSlope(smooth.data(), 3 * half + c, 3 * half + c + 42, 3);
-        float running = static_cast<float>(smooth[3 * half + c]);
+        const float startValue = static_cast<float>(smooth[3 * half + c]);
+        const float endSlope = CalcVectSlope(smooth.data(), 3 * (n - 16 - half) + c, 3 * endElement + c, 3);
+        const float endValue = static_cast<float>(smooth[3 * endElement + c]);
+        float running = startValue;
         for (int e = half - 1; e >= 0; --e) {
             running -= startSlope;
             if (running < 0.0f) running = 0.0f;
             smooth[3 * e + c] = imagelib::round(running);
         }
-        const int endElement = n - 2 - half;
-        const float endSlope = CalcVectSlope(smooth.data(), 3 * (n - 16 - half) + c, 3 * endElement + c, 3);
-        running = static_cast<float>(smooth[3 * endElement + c]);
+        running = endValue;
         for (int e = n - 1 - half; e < n; ++e) {
             running += endSlope;
             if (running < 0.0f) running = 0.0f;

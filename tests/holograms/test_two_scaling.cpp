@@ -102,6 +102,12 @@ TEST(TwoScaling, ProfileSmoothingAveragesTheMiddleAndExtendsTheEndsAboveZero) {
     std::vector<int> tooShort(3 * 77, 5);
     remover.CalcAvRGBVect(tooShort.data(), 77, 63);  // refused: fewer than window + 15
     EXPECT_EQ(tooShort, std::vector<int>(3 * 77, 5));
+    std::vector<int> evenWindow(3 * 79, 5);
+    remover.CalcAvRGBVect(evenWindow.data(), 79, 64);  // even: the end slope would need element h - 1
+    EXPECT_EQ(evenWindow, std::vector<int>(3 * 79, 5));
+    std::vector<int> longEnough(3 * 80, 5);
+    remover.CalcAvRGBVect(longEnough.data(), 80, 64);  // accepted: a flat profile stays flat
+    EXPECT_EQ(longEnough, std::vector<int>(3 * 80, 5));
 }
 
 TEST(TwoScaling, BoxAverageOfWindow28CopiesTheBorder) {
