@@ -1,24 +1,19 @@
 // The tool's answers to bad input: one line naming the file, exit code 2, no output file.
-#include <gtest/gtest.h>
-
-#include <sys/wait.h>
-
-#include <cstdlib>
 #include <filesystem>
 #include <fstream>
 #include <string>
 
 #include "imagelib/CImage.h"
+#include "tools/ToolTestSupport.h"
 
 namespace fs = std::filesystem;
 
 namespace {
 
-class ToolTest : public ::testing::Test {
+class ToolTest : public ToolFixture {
 protected:
     void SetUp() override {
-        dir = fs::temp_directory_path() / ("varnoth-tool-" + std::to_string(::getpid()));
-        fs::create_directories(dir);
+        ToolFixture::SetUp();
         CImage a(9, 7, 24), b(9, 7, 24), small(4, 4, 24);
         a.Set(100);
         b.Set(50);
@@ -27,21 +22,6 @@ protected:
         ASSERT_TRUE(small.ExportFile(Path("small.png")));
         std::ofstream(Path("text.png")) << "hello";
     }
-    void TearDown() override { fs::remove_all(dir); }
-    std::string Path(const std::string& name) const { return (dir / name).string(); }
-
-    // Runs the tool; returns its exit code and keeps standard error in `errors`.
-    int Run(const std::string& args) {
-        const std::string errFile = Path("stderr.txt");
-        const std::string cmd = std::string(VARNOTH_TOOL_PATH) + " " + args + " >/dev/null 2>" + errFile;
-        const int status = std::system(cmd.c_str());
-        std::ifstream in(errFile);
-        errors.assign(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
-        return WIFEXITED(status) ? WEXITSTATUS(status) : -1;
-    }
-
-    fs::path dir;
-    std::string errors;
 };
 
 }  // namespace
