@@ -7,6 +7,7 @@
 #include <deque>
 #include <utility>
 
+#include "frame/ImageArithmetic.h"
 #include "frame/Matrix.h"
 #include "holograms/HologramsRemove.h"
 #include "holograms/PixelHelpersInternal.h"
@@ -62,23 +63,6 @@ void UnitVector(const unsigned char* p, ZentMatrix::CMatrix<float>& v) {
     for (uint32_t c = 0; c < 3; ++c) v[c] = static_cast<float>(p[c]);
     const float length = std::sqrt(v.dot(v));
     if (length > 0.0f) v.scale(1.0f / length);
-}
-
-// detail = image - average + 128 per byte, clamped.
-void DetailImage(const CImage& image, const CImage& average, CImage& detail) {
-    const int width = image.GetWidth();
-    detail.Reallocate(width, image.GetHeight(), 24, 0);
-    imagelib::ParallelFor(
-        0, image.GetHeight(),
-        [&](int begin, int end) {
-            for (int y = begin; y < end; ++y) {
-                const unsigned char* in = Row(image, y);
-                const unsigned char* av = Row(average, y);
-                unsigned char* out = Row(detail, y);
-                for (int i = 0; i < 3 * width; ++i) out[i] = ClampByte(in[i] - av[i] + 128);
-            }
-        },
-        16);
 }
 
 // The seed list is emptied however the pipeline ends; the records live in `storage`.
@@ -304,8 +288,9 @@ void CHologramsRemove::HologramsSeperation3(CImage& image1, CImage& image2, CIma
     CImage average1, average2, detail1, detail2;
     CalcAvImg_24(image2, average2, 64);
     CalcAvImg_24(image1, average1, 64);
-    holo::DetailImage(image2, average2, detail2);
-    holo::DetailImage(image1, average1, detail1);
+    // Detail = image - average + 128 per byte, clamped: the frame's vectorised subtraction.
+    ImageSubtract(image2, average2, detail2);
+    ImageSubtract(image1, average1, detail1);
 
     holo::SeedListGuard guard{m_seedList};
     m_seedList.RemoveAll();
