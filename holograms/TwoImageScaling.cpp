@@ -7,6 +7,7 @@
 #include <limits>
 #include <vector>
 
+#include "holograms/BoxAverageInternal.h"
 #include "holograms/HologramsRemove.h"
 #include "holograms/PixelHelpersInternal.h"
 #include "imagelib/Parallel.h"
@@ -102,14 +103,18 @@ private:
 
 // Box-average output rows for the input rows y in [yBegin, yEnd), W <= y < height. The column
 // sums are rebuilt from rows yBegin - W ... yBegin - 1, so bands are independent and the result
-// is that of one pass over all rows.
-template <int kBytesPerPixel>
+// is that of one pass over all rows. Each output row first collects its window sums, then
+// divides them all at once (vectorised) when kBatched; otherwise it divides one by one.
+template <int kBytesPerPixel, bool kBatched>
 void BoxAverageBand(const CImage& source, CImage& destination, int window, int yBegin, int yEnd) {
     const int width = source.GetWidth();
     const int half = window / 2;
     const size_t rowBytes = static_cast<size_t>(width) * kBytesPerPixel;
-    const ExactDivider divide(static_cast<uint64_t>(window) * static_cast<uint64_t>(window));
+    const size_t outputs = static_cast<size_t>(width - window) * kBytesPerPixel;
+    const uint64_t area = static_cast<uint64_t>(window) * static_cast<uint64_t>(window);
+    const ExactDivider divide(area);
     std::vector<uint32_t> columnSum(rowBytes, 0);
+    std::vector<uint32_t> windowSums(kBatched ? outputs : 0);
     for (int r = yBegin - window; r < yBegin; ++r) {
         const unsigned char* row = Row(source, r);
         for (size_t i = 0; i < rowBytes; ++i) columnSum[i] += row[i];
@@ -125,10 +130,14 @@ void BoxAverageBand(const CImage& source, CImage& destination, int window, int y
             const size_t dropped = static_cast<size_t>(x - window) * kBytesPerPixel;
             const size_t added = static_cast<size_t>(x) * kBytesPerPixel;
             for (int c = 0; c < kBytesPerPixel; ++c) {
-                out[dropped + c] = static_cast<unsigned char>(divide(sums[c]));
+                if constexpr (kBatched)
+                    windowSums[dropped + c] = static_cast<uint32_t>(sums[c]);
+                else
+                    out[dropped + c] = static_cast<unsigned char>(divide(sums[c]));
                 sums[c] += static_cast<uint64_t>(columns[added + c]) - columns[dropped + c];
             }
         }
+        if constexpr (kBatched) FastDivideSums(windowSums.data(), out, outputs, static_cast<uint32_t>(area));
         const unsigned char* leaving = Row(source, y - window);
         const unsigned char* entering = Row(source, y);
         for (size_t i = 0; i < rowBytes; ++i) columnSum[i] = columnSum[i] - leaving[i] + entering[i];
@@ -141,7 +150,11 @@ bool WindowFits(const CImage& image, int window) {
 }
 
 void BoxAverage(const CImage& source, CImage& destination, int window) {
-    const auto band = source.GetBitCount() == 8 ? BoxAverageBand<1> : BoxAverageBand<3>;
+    // Windows up to 256 keep every sum within the vectorised division's exact range.
+    const bool batched = window <= 256;
+    const bool grey = source.GetBitCount() == 8;
+    const auto band = grey ? (batched ? BoxAverageBand<1, true> : BoxAverageBand<1, false>)
+                           : (batched ? BoxAverageBand<3, true> : BoxAverageBand<3, false>);
     destination.Reallocate(source.GetWidth(), source.GetHeight(), source.GetBitCount(), 0);
     if (!WindowFits(source, window)) return;
     // Bands of at least 4 windows keep the cost of rebuilding the column sums small.

@@ -3,6 +3,7 @@
 #include <cmath>
 #include <vector>
 
+#include "holograms/BoxAverageInternal.h"
 #include "test_two_support.h"
 
 using namespace two_test;
@@ -206,4 +207,22 @@ TEST(TwoScaling, ProfilesGoToRowAndColumnZero) {
     EXPECT_EQ(Px(image, 50, 0), (std::vector<int>{100, 60, 0}));
     EXPECT_EQ(Px(image, 0, 40), (std::vector<int>{100, 60, 0}));
     EXPECT_EQ(Px(image, 50, 40), (std::vector<int>{100, 60, 20}));
+}
+
+// The vectorised division against the plain one at the quotient boundaries, odd and even lengths.
+TEST(TwoScaling, VectorDivisionOfWindowSumsMatchesThePlainOne) {
+    for (uint32_t area : {1u, 9u, 784u, 4096u, 65025u, 65536u, 70000u}) {
+        std::vector<uint32_t> sums;
+        for (uint32_t q = 0; q <= 255; ++q)
+            for (uint32_t delta : {0u, 1u, area / 2, area - 1})
+                if (q * area + delta <= 255 * area) sums.push_back(q * area + delta);
+        Random rnd(area);
+        for (int i = 0; i < 37; ++i) sums.push_back(static_cast<uint32_t>(rnd.Next() % (255 * area + 1)));
+        for (size_t n : {sums.size(), sums.size() - 1}) {
+            std::vector<uint8_t> plain(n), fast(n);
+            holo::PlainDivideSums(sums.data(), plain.data(), n, area);
+            holo::FastDivideSums(sums.data(), fast.data(), n, area);
+            ASSERT_EQ(plain, fast) << "area " << area << " n " << n;
+        }
+    }
 }
