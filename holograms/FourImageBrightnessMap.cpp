@@ -5,10 +5,12 @@
 #include <cmath>
 #include <cstdlib>
 #include <cstring>
+#include <vector>
 
 #include "holograms/FourImageBrightnessMapInternal.h"
 #include "holograms/FourImageInternal.h"
 #include "holograms/HologramsRemove.h"
+#include "imagelib/Parallel.h"
 #include "imagelib/Trace.h"
 
 using holo4::CopyPixel;
@@ -23,16 +25,17 @@ void Proportions(const unsigned char* p, float out[3]) {
     for (int c = 0; c < 3; ++c) out[c] = m == 0 ? 0.0f : static_cast<float>(p[c]) / static_cast<float>(m);
 }
 
-void RebuildPixel(const unsigned char* const at[4], const unsigned char* const leftOf[4],
-                  const unsigned char* const above[4], const unsigned char* resultLeft,
-                  const unsigned char* resultAbove, unsigned char* out, unsigned char* flags) {
-    int bestHd[3] = {0, 0, 0}, bestVd[3] = {0, 0, 0};
+void AnalysePixel(const unsigned char* const at[4], const unsigned char* const leftOf[4],
+                  const unsigned char* const above[4], PixelAnalysis& a) {
     int bestH = kMaxUsableDifference, bestV = kMaxUsableDifference;
-    bool saturated[4];
-    unsigned char map = 0;
+    a.flags = 0;
+    for (int c = 0; c < 3; ++c) a.hd[c] = a.vd[c] = 0;
     for (int i = 0; i < 4; ++i) {
-        saturated[i] = MaxChannel(at[i]) > kBrightMapSaturation;
-        if (saturated[i]) map |= static_cast<unsigned char>(1u << (4 + i));
+        const bool saturated = MaxChannel(at[i]) > kBrightMapSaturation;
+        if (saturated) {
+            a.flags |= static_cast<unsigned char>(1u << (4 + i));
+            continue;
+        }
         int hd[3], vd[3], hmax = 0, vmax = 0;
         for (int c = 0; c < 3; ++c) {
             hd[c] = at[i][c] - leftOf[i][c];
@@ -40,40 +43,48 @@ void RebuildPixel(const unsigned char* const at[4], const unsigned char* const l
             hmax = std::max(hmax, std::abs(hd[c]));
             vmax = std::max(vmax, std::abs(vd[c]));
         }
-        if (saturated[i]) continue;
         if (hmax < bestH) {
             bestH = hmax;
-            std::memcpy(bestHd, hd, sizeof hd);
+            for (int c = 0; c < 3; ++c) a.hd[c] = static_cast<int16_t>(hd[c]);
         }
         if (vmax < bestV) {
             bestV = vmax;
-            std::memcpy(bestVd, vd, sizeof vd);
+            for (int c = 0; c < 3; ++c) a.vd[c] = static_cast<int16_t>(vd[c]);
         }
+        Proportions(at[i], a.proportion[i]);
     }
-    *flags = map;
+}
 
+void FinishPixel(const PixelAnalysis& a, const unsigned char* const at[4], const unsigned char* resultLeft,
+                 const unsigned char* resultAbove, unsigned char* out) {
     for (int c = 0; c < 3; ++c) {
-        const int a = std::clamp(resultLeft[c] + bestHd[c], 0, 255);
-        const int b = std::clamp(resultAbove[c] + bestVd[c], 0, 255);
-        out[c] = static_cast<unsigned char>((a + b) >> 1);
+        const int left = std::clamp(resultLeft[c] + a.hd[c], 0, 255);
+        const int up = std::clamp(resultAbove[c] + a.vd[c], 0, 255);
+        out[c] = static_cast<unsigned char>((left + up) >> 1);
     }
-
     float rebuilt[3];
     Proportions(out, rebuilt);
     float bestDistance = kStartDistance;
     int closest = -1;
     for (int i = 0; i < 4; ++i) {
-        if (saturated[i]) continue;
-        float own[3];
-        Proportions(at[i], own);
+        if (a.flags & (1u << (4 + i))) continue;
         float distance = 0.0f;
-        for (int c = 0; c < 3; ++c) distance = std::max(distance, std::fabs(own[c] - rebuilt[c]));
+        for (int c = 0; c < 3; ++c) distance = std::max(distance, std::fabs(a.proportion[i][c] - rebuilt[c]));
         if (distance < bestDistance) {
             bestDistance = distance;
             closest = i;
         }
     }
     if (closest >= 0) CopyPixel(out, at[closest]);
+}
+
+void RebuildPixel(const unsigned char* const at[4], const unsigned char* const leftOf[4],
+                  const unsigned char* const above[4], const unsigned char* resultLeft,
+                  const unsigned char* resultAbove, unsigned char* out, unsigned char* flags) {
+    PixelAnalysis a;
+    AnalysePixel(at, leftOf, above, a);
+    *flags = a.flags;
+    FinishPixel(a, at, resultLeft, resultAbove, out);
 }
 
 }  // namespace holo4
@@ -84,15 +95,6 @@ void CopyRowBytes(const CImage& src, CImage& dst, int y) {
     std::memcpy(dst.GetPtrXY(0, y), src.GetPtrXY(0, y), static_cast<size_t>(src.GetSpan()));
 }
 
-// Rows 0 and 1 from bottom, then rows h - 2 and h - 1 from top (the later wins where they
-// meet in images of fewer than four rows).
-void CopyBorderRows(const CImage& top, const CImage& bottom, CImage& result) {
-    const int h = top.GetHeight();
-    for (int y = 0; y < 2 && y < h; ++y) CopyRowBytes(bottom, result, y);
-    for (int y = h - 2; y < h; ++y)
-        if (y >= 0) CopyRowBytes(top, result, y);
-}
-
 // The darker of the edge source and the side shot supplies the two edge pixels.
 void CopyEdgePair(const unsigned char* edgeRow, const unsigned char* sideRow, unsigned char* out, int testPixel,
                   int firstPixel) {
@@ -101,7 +103,105 @@ void CopyEdgePair(const unsigned char* edgeRow, const unsigned char* sideRow, un
     std::memcpy(out + 3 * firstPixel, src + 3 * firstPixel, 6);
 }
 
+// Candidate rows at (x, y): the pixels, their left neighbours and the pixels above.
+struct CandidateRows {
+    const unsigned char* row[4];
+    const unsigned char* above[4];
+
+    CandidateRows(const CImage* const in[4], int y) {
+        for (int i = 0; i < 4; ++i) {
+            row[i] = in[i]->GetPtrXY(0, y);
+            above[i] = in[i]->GetPtrXY(0, y - 1);
+        }
+    }
+    void At(int x, const unsigned char* at[4], const unsigned char* leftOf[4], const unsigned char* up[4]) const {
+        for (int i = 0; i < 4; ++i) {
+            at[i] = row[i] + 3 * x;
+            leftOf[i] = at[i] - 3;
+            up[i] = above[i] + 3 * x;
+        }
+    }
+};
+
+// Inner row y: the two edge pairs, which depend on the inputs only.
+void CopyEdges(const CImage* const in[4], CImage& out, int y) {
+    const int w = in[0]->GetWidth(), h = in[0]->GetHeight();
+    const CImage& edge = y <= h / 2 ? *in[1] : *in[0];  // bottom in the upper half, top below
+    unsigned char* outRow = out.GetPtrXY(0, y);
+    CopyEdgePair(edge.GetPtrXY(0, y), in[3]->GetPtrXY(0, y), outRow, 1, 0);      // right
+    CopyEdgePair(edge.GetPtrXY(0, y), in[2]->GetPtrXY(0, y), outRow, w - 2, w - 2);  // left
+}
+
+// Rows 0 and 1 from bottom, then rows h - 2 and h - 1 from top (the later wins where they
+// meet in images of fewer than four rows).
+void CopyBorderRows(const CImage* const in[4], CImage& out) {
+    const int h = in[0]->GetHeight();
+    for (int y = 0; y < 2 && y < h; ++y) CopyRowBytes(*in[1], out, y);
+    for (int y = h - 2; y < h; ++y)
+        if (y >= 0) CopyRowBytes(*in[0], out, y);
+}
+
 }  // namespace
+
+namespace holo4 {
+
+void ComposeBrightnessMapPlain(const CImage* const in[4], CImage& out, CImage& brightMap) {
+    const int w = in[0]->GetWidth(), h = in[0]->GetHeight();
+    CopyBorderRows(in, out);
+    for (int y = 2; y <= h - 3; ++y) {
+        CopyEdges(in, out, y);
+        const CandidateRows rows(in, y);
+        unsigned char* outRow = out.GetPtrXY(0, y);
+        const unsigned char* outAbove = out.GetPtrXY(0, y - 1);
+        unsigned char* mapRow = brightMap.GetPtrXY(0, y);
+        for (int x = 2; x <= w - 3; ++x) {
+            const unsigned char *at[4], *leftOf[4], *up[4];
+            rows.At(x, at, leftOf, up);
+            RebuildPixel(at, leftOf, up, outRow + 3 * x - 3, outAbove + 3 * x, outRow + 3 * x, mapRow + x);
+        }
+    }
+}
+
+void ComposeBrightnessMapFast(const CImage* const in[4], CImage& out, CImage& brightMap) {
+    // What a pixel takes from the shots does not depend on the result, so it is worked out
+    // for a band of rows in parallel; then the band is rebuilt in raster order, which the
+    // dependence on the finished left and upper pixels requires.
+    constexpr int kBandRows = 32;
+    const int w = in[0]->GetWidth(), h = in[0]->GetHeight();
+    const int inner = w - 4 > 0 ? w - 4 : 0;
+    std::vector<PixelAnalysis> analysis(static_cast<size_t>(kBandRows) * inner);
+    CopyBorderRows(in, out);
+    for (int first = 2; first <= h - 3; first += kBandRows) {
+        const int last = std::min(first + kBandRows, h - 2);  // exclusive
+        imagelib::ParallelFor(first, last, [&](int begin, int end) {
+            for (int y = begin; y < end; ++y) {
+                CopyEdges(in, out, y);
+                const CandidateRows rows(in, y);
+                PixelAnalysis* a = analysis.data() + static_cast<size_t>(y - first) * inner;
+                for (int x = 2; x <= w - 3; ++x) {
+                    const unsigned char *at[4], *leftOf[4], *up[4];
+                    rows.At(x, at, leftOf, up);
+                    AnalysePixel(at, leftOf, up, a[x - 2]);
+                }
+            }
+        }, 4);
+        for (int y = first; y < last; ++y) {
+            const CandidateRows rows(in, y);
+            const PixelAnalysis* a = analysis.data() + static_cast<size_t>(y - first) * inner;
+            unsigned char* outRow = out.GetPtrXY(0, y);
+            const unsigned char* outAbove = out.GetPtrXY(0, y - 1);
+            unsigned char* mapRow = brightMap.GetPtrXY(0, y);
+            for (int x = 2; x <= w - 3; ++x) {
+                const unsigned char *at[4], *leftOf[4], *up[4];
+                rows.At(x, at, leftOf, up);
+                mapRow[x] = a[x - 2].flags;
+                FinishPixel(a[x - 2], at, outRow + 3 * x - 3, outAbove + 3 * x, outRow + 3 * x);
+            }
+        }
+    }
+}
+
+}  // namespace holo4
 
 void CHologramsRemove::HologramsRemove4Img2(const CImage& top, const CImage& bottom, const CImage& left,
                                             const CImage& right, CImage& result) {
@@ -118,31 +218,8 @@ void CHologramsRemove::HologramsRemove4Img2(const CImage& top, const CImage& bot
     bottom.ExportFile(L"\\results\\bot.jpg");
     left.ExportFile(L"\\results\\left.jpg");
     right.ExportFile(L"\\results\\right.jpg");
-    CopyBorderRows(top, bottom, out);
-
     const CImage* const inputs[4] = {&top, &bottom, &left, &right};
-    for (int y = 2; y <= h - 3; ++y) {
-        const CImage& edge = y <= h / 2 ? bottom : top;
-        unsigned char* outRow = out.GetPtrXY(0, y);
-        const unsigned char* outAbove = out.GetPtrXY(0, y - 1);
-        CopyEdgePair(edge.GetPtrXY(0, y), right.GetPtrXY(0, y), outRow, 1, 0);
-        CopyEdgePair(edge.GetPtrXY(0, y), left.GetPtrXY(0, y), outRow, w - 2, w - 2);
-
-        const unsigned char* rows[4];
-        const unsigned char* above[4];
-        for (int i = 0; i < 4; ++i) {
-            rows[i] = inputs[i]->GetPtrXY(0, y);
-            above[i] = inputs[i]->GetPtrXY(0, y - 1);
-        }
-        unsigned char* mapRow = brightMap.GetPtrXY(0, y);
-        for (int x = 2; x <= w - 3; ++x) {
-            const int o = 3 * x;
-            const unsigned char* at[4] = {rows[0] + o, rows[1] + o, rows[2] + o, rows[3] + o};
-            const unsigned char* leftOf[4] = {at[0] - 3, at[1] - 3, at[2] - 3, at[3] - 3};
-            const unsigned char* up[4] = {above[0] + o, above[1] + o, above[2] + o, above[3] + o};
-            holo4::RebuildPixel(at, leftOf, up, outRow + o - 3, outAbove + o, outRow + o, mapRow + x);
-        }
-    }
+    holo4::ComposeBrightnessMapFast(inputs, out, brightMap);
     brightMap.ExportFile(L"\\Results\\brightMap.bmp");
     result = std::move(out);
 }

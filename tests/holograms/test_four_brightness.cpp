@@ -94,3 +94,17 @@ TEST(FourImageBrightnessMap, NarrowOrMismatchedInputsAreRefused) {
     remover.HologramsRemove4Img2(a, a, b, a, result);
     EXPECT_EQ(result.GetWidth(), 2);
 }
+
+TEST(FourImageBrightnessMap, BandedPassMatchesThePlainRasterPass) {
+    for (int size : {4, 5, 37, 71}) {
+        const CImage t = RandomImage(size, size + 30, 24, 11), b = Darkened(RandomImage(size, size + 30, 24, 12));
+        const CImage l = Darkened(RandomImage(size, size + 30, 24, 13)), r = RandomImage(size, size + 30, 24, 14);
+        const CImage* const in[4] = {&t, &b, &l, &r};
+        CImage plain(size, size + 30, 24), fast(size, size + 30, 24), plainMap(size, size + 30, 8),
+            fastMap(size, size + 30, 8);
+        holo4::ComposeBrightnessMapPlain(in, plain, plainMap);
+        holo4::ComposeBrightnessMapFast(in, fast, fastMap);
+        EXPECT_TRUE(SamePixels(plain, fast)) << size;
+        EXPECT_TRUE(SamePixels(plainMap, fastMap)) << size;
+    }
+}
