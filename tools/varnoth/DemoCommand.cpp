@@ -80,10 +80,19 @@ CImage Montage(const scene::Scene& s, const CImage& result) {
     return m;
 }
 
+// The output directory, created when missing; a bad one is the user's error (exit 2).
+void MakeOutputDirectory(const std::string& path) {
+    std::error_code error;
+    std::filesystem::create_directories(path, error);
+    if (error || !std::filesystem::is_directory(path))
+        throw ToolError("--out " + path + ": cannot be used as a directory" +
+                        (error ? " (" + error.message() + ")" : std::string(" (it is a file)")));
+}
+
 void RunDemo(const DemoArgs& args) {
     int w = 0, h = 0;
     ParseSize(args.size, w, h);
-    std::filesystem::create_directories(args.outDir);
+    MakeOutputDirectory(args.outDir);
     const std::string dir = args.outDir + "/";
 
     CStopWatch watch;
