@@ -92,25 +92,29 @@ void CHologramsRemove::ExpandHologramsBolbsN(CImage& mask, int border, int itera
         }
     }
 
+    // Each pass reads the mask as it was before the pass. Neighbours outside the image are absent.
     for (int pass = 0; pass < iterations; ++pass) {
         const CImage before(mask);
         for (int y = border; y < height - border; ++y) {
+            const unsigned char* above = y > 0 ? Row(before, y - 1) : nullptr;
+            const unsigned char* row = Row(before, y);
+            const unsigned char* below = y + 1 < height ? Row(before, y + 1) : nullptr;
             unsigned char* out = Row(mask, y);
             for (int x = border; x < width - border; ++x) {
-                if (Row(before, y)[3 * x] != 0) continue;
-                int sums[3] = {0, 0, 0};
-                int marked = 0;
-                for (const auto& step : holo::kFourNeighbours) {
-                    const int nx = x + step[0];
-                    const int ny = y + step[1];
-                    if (nx < 0 || ny < 0 || nx >= width || ny >= height) continue;
-                    const unsigned char* n = Row(before, ny) + 3 * nx;
-                    if (n[0] == 0) continue;
-                    for (int c = 0; c < 3; ++c) sums[c] += n[c];
-                    ++marked;
+                const int at = 3 * x;
+                if (row[at] != 0) continue;
+                const unsigned char* marked[4];
+                int count = 0;
+                if (x > 0 && row[at - 3] != 0) marked[count++] = row + at - 3;
+                if (x + 1 < width && row[at + 3] != 0) marked[count++] = row + at + 3;
+                if (above != nullptr && above[at] != 0) marked[count++] = above + at;
+                if (below != nullptr && below[at] != 0) marked[count++] = below + at;
+                if (count == 0) continue;
+                for (int c = 0; c < 3; ++c) {
+                    int sum = 0;
+                    for (int k = 0; k < count; ++k) sum += marked[k][c];
+                    out[at + c] = static_cast<unsigned char>(sum / count);
                 }
-                if (marked == 0) continue;
-                for (int c = 0; c < 3; ++c) out[3 * x + c] = static_cast<unsigned char>(sums[c] / marked);
             }
         }
     }

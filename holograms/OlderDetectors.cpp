@@ -49,8 +49,6 @@ bool PrepareVote(const wchar_t* name, int bits, VoteImages& v, int radius, int& 
     if (&v.map1 == &v.map2 && Refuse(name, "the two maps are one image")) return false;
     v.map1.Reallocate(v.image1.GetWidth(), v.image1.GetHeight(), 8, 0);
     v.map2.Reallocate(v.image1.GetWidth(), v.image1.GetHeight(), 8, 0);
-    v.map1.Set(0);
-    v.map2.Set(0);
     count1 = 0;
     count2 = 0;
     // Any radius of 0 or more keeps the neighbours of every evaluated pixel inside the rows;
@@ -95,7 +93,6 @@ void CHologramsRemove::SubImg_8(CImage& image1, CImage& image2, CImage& output, 
     if ((&output == &image1 || &output == &image2) && Refuse(L"SubImg_8", "the output is an input")) return;
     if (border < 0 && Refuse(L"SubImg_8", "negative border")) return;
     output.Reallocate(image1.GetWidth(), image1.GetHeight(), 8, 0);
-    output.Set(0);
     for (int y = border; y < image1.GetHeight() - border; ++y) {
         const unsigned char* p1 = Row(image1, y);
         const unsigned char* p2 = Row(image2, y);
@@ -221,8 +218,6 @@ void CHologramsRemove::GradImg_24(CImage& image, CImage& horizontal, CImage& ver
     const int height = source.GetHeight();
     horizontal.Reallocate(width, height, 24, 0);
     vertical.Reallocate(width, height, 24, 0);
-    horizontal.Set(0);
-    vertical.Set(0);
     const int span = source.GetSpan();
     imagelib::ParallelFor(
         border, height - border,

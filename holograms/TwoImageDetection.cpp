@@ -42,7 +42,6 @@ bool BuildDifference(const wchar_t* name, CImage& image1, CImage& image2, CImage
     if ((&difference == &image1 || &difference == &image2) && Refuse(name, "the difference image is an input"))
         return false;
     difference.Reallocate(image1.GetWidth(), image1.GetHeight(), 24, 0);
-    difference.Set(0);
     const auto table = DifferenceTable(gain);
     const int width = image1.GetWidth();
     const int height = image1.GetHeight();
@@ -116,8 +115,6 @@ void CHologramsRemove::Find_HologramPixels_24_New_Alg3(CImage& difference, CImag
     const int height = difference.GetHeight();
     map1.Reallocate(width, height, 24, 0);
     map2.Reallocate(width, height, 24, 0);
-    map1.Set(0);
-    map2.Set(0);
 
     const int firstRow = std::max(topRow - 10, border);
     const int endRow = std::min(height - border, bottomRow + 10);
