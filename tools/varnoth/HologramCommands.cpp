@@ -43,7 +43,8 @@ void AddHolo4Command(CLI::App& app) {
         method->run(remover, order, result);
         const double ms = watch.ElapsedMicro() / 1000.0;
         if (result.IsEmpty())
-            throw ToolError("the shots are too small for a seven-level pyramid (at least 65 x 65 pixels)");
+            throw ToolError(std::string("the shots are too small for --method ") + method->name +
+                            " (the pyramid methods need at least 65 x 65 pixels, brightness 4 columns)");
         SaveImage(result, args->out);
         std::printf("holo4 %s: %d x %d in %.1f ms -> %s\n", method->name, result.GetWidth(), result.GetHeight(), ms,
                     args->out.c_str());
