@@ -241,26 +241,27 @@ void CHologramsRemove::HologramsSeperation(CImage& image1, CImage& image2, CImag
 void CHologramsRemove::HologramsSeperation2(CImage& image1, CImage& image2, CImage&, int, int) {
     if (!holo::PipelineInputsValid(L"HologramsSeperation2", image1, image2)) return;
     constexpr int kLevels = 7;
-    CPyramid result, pyramid2, pyramid1;
+    // Image 1's Laplacian pyramid is turned into the result in place: every level starts as
+    // image 1's and takes image 2's pixel where that one wins, which is the same as filling a
+    // fresh result pyramid, without allocating and copying a third pyramid.
+    CPyramid result, pyramid2;
     {
         imagelib::TaskGroup tasks;
-        tasks.Run([&] { result.Init(image2.GetWidth(), image2.GetHeight(), 3, kLevels); });
         tasks.Run([&] {
             pyramid2.Init(image2, kLevels);
             pyramid2.MakeLaplacian();
         });
         tasks.Run([&] {
-            pyramid1.Init(image1, kLevels);
-            pyramid1.MakeLaplacian();
+            result.Init(image1, kLevels);
+            result.MakeLaplacian();
         });
         tasks.Wait();
     }
-    result.GetLevel(kLevels - 1) = pyramid2.GetLevel(kLevels - 1);
+    result.GetLevel(kLevels - 1) = std::move(pyramid2.GetLevel(kLevels - 1));
     // Per pixel, the detail whose largest channel is smaller; ties go to image 1.
     for (int level = kLevels - 2; level >= 0; --level) {
         CImage& out = result.GetLevel(level);
         const CImage& level2 = pyramid2.GetLevel(level);
-        out = pyramid1.GetLevel(level);
         const int width = out.GetWidth();
         imagelib::ParallelFor(
             0, out.GetHeight(),
@@ -280,7 +281,7 @@ void CHologramsRemove::HologramsSeperation2(CImage& image1, CImage& image2, CIma
     }
     result.ForceType(CPyramid::PyrLaplacian);
     result.ReconstructGaussian();
-    image1 = result.GetLevel(0);
+    image1 = std::move(result.GetLevel(0));
 }
 
 void CHologramsRemove::HologramsSeperation3(CImage& image1, CImage& image2, CImage&, int topRow, int bottomRow) {
