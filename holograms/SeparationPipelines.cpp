@@ -65,7 +65,7 @@ void UnitVector(const unsigned char* p, ZentMatrix::CMatrix<float>& v) {
     if (length > 0.0f) v.scale(1.0f / length);
 }
 
-// The seed list is emptied however the pipeline ends; the records live in `storage`.
+// The seed list is emptied however the pipeline ends; the records belong to SeedGrowth.
 struct SeedListGuard {
     CArray<HologramSeed*>& list;
     ~SeedListGuard() { list.RemoveAll(); }
