@@ -143,18 +143,15 @@ namespace {
 // are added up afterwards (sums of counts do not depend on the split).
 constexpr int kBands = 64;
 
-// The candidates' HSV triples and saturation flags of one level. Allocated once for the
-// finest level and reused by the coarser ones; every byte is written before it is read.
+// The candidates' HSV triples of one level. Allocated once for the finest level and reused
+// by the coarser ones; every byte is written before it is read. The saturation masks are
+// not stored: they are read off the brightness kept with the pyramids.
 struct LevelPlanes {
     explicit LevelPlanes(size_t maxPixels) {
-        for (int i = 0; i < 4; ++i) {
-            hsv[i] = std::make_unique_for_overwrite<uint8_t[]>(3 * maxPixels);
-            mask[i] = std::make_unique_for_overwrite<uint8_t[]>(maxPixels);
-        }
+        for (int i = 0; i < 4; ++i) hsv[i] = std::make_unique_for_overwrite<uint8_t[]>(3 * maxPixels);
     }
     int width = 0, height = 0;
-    std::unique_ptr<uint8_t[]> hsv[4];   // 3 bytes a pixel
-    std::unique_ptr<uint8_t[]> mask[4];  // 1 = saturated
+    std::unique_ptr<uint8_t[]> hsv[4];  // 3 bytes a pixel
 };
 
 void FirstPass(const holo4::CandidatePyramids& c, int level, LevelPlanes& planes,
@@ -182,7 +179,6 @@ void FirstPass(const holo4::CandidatePyramids& c, int level, LevelPlanes& planes
                     for (int i = 0; i < 4; ++i) {
                         hsv[i] = &planes.hsv[i][3 * at];
                         saturated[i] = holo4::IsHsvSaturated(brightRow[i][x]);
-                        planes.mask[i][at] = saturated[i] ? 1 : 0;
                     }
                     // Pixels where every shot is saturated have no spread and stay out.
                     const holo4::Spreads s = holo4::SpreadsOf(hsv, saturated);
@@ -200,12 +196,17 @@ void FirstPass(const holo4::CandidatePyramids& c, int level, LevelPlanes& planes
         }
 }
 
-void SecondPass(const CPyramid lap[4], int level, const LevelPlanes& planes, int ts, int tv, CImage& out) {
+void SecondPass(const holo4::CandidatePyramids& c, int level, const LevelPlanes& planes, int ts, int tv,
+                CImage& out) {
     const int w = planes.width;
     holo4::ForEachRowBand(planes.height, [&](int begin, int end) {
         for (int y = begin; y < end; ++y) {
             const unsigned char* lapRow[4];
-            for (int i = 0; i < 4; ++i) lapRow[i] = lap[i].GetLevel(level).GetPtrXY(0, y);
+            const unsigned char* brightRow[4];
+            for (int i = 0; i < 4; ++i) {
+                lapRow[i] = c.laplacian[i].GetLevel(level).GetPtrXY(0, y);
+                brightRow[i] = c.brightness[i][level].GetPtrXY(0, y);
+            }
             unsigned char* outRow = out.GetPtrXY(0, y);
             for (int x = 0; x < w; ++x) {
                 const size_t at = static_cast<size_t>(y) * w + x;
@@ -213,8 +214,8 @@ void SecondPass(const CPyramid lap[4], int level, const LevelPlanes& planes, int
                                                   lapRow[3] + 3 * x};
                 const unsigned char* hsv[4] = {&planes.hsv[0][3 * at], &planes.hsv[1][3 * at],
                                                &planes.hsv[2][3 * at], &planes.hsv[3][3 * at]};
-                const bool masked[4] = {planes.mask[0][at] != 0, planes.mask[1][at] != 0, planes.mask[2][at] != 0,
-                                        planes.mask[3][at] != 0};
+                const bool masked[4] = {holo4::IsHsvSaturated(brightRow[0][x]), holo4::IsHsvSaturated(brightRow[1][x]),
+                                        holo4::IsHsvSaturated(brightRow[2][x]), holo4::IsHsvSaturated(brightRow[3][x])};
                 holo4::DecidePixel(detail, hsv, masked, ts, tv, outRow + 3 * x);
             }
         }
@@ -258,7 +259,7 @@ void CHologramsRemove::HologramsRemove4Img4(const CImage& top, const CImage& bot
         FirstPass(pyramids, level, planes, histS, histV);
         const int64_t n = static_cast<int64_t>(planes.width) * planes.height * 15 / 100;
         const int ts = holo4::SpreadThreshold(histS, n), tv = holo4::SpreadThreshold(histV, n);
-        SecondPass(laplacian, level, planes, ts, tv, resultPyr.GetLevel(level));
+        SecondPass(pyramids, level, planes, ts, tv, resultPyr.GetLevel(level));
     }
     holo4::CollapseInto(resultPyr, result);
 }
