@@ -57,10 +57,11 @@ protected:
         EXPECT_FALSE(std::filesystem::exists(Path(outputFile))) << outputFile;
     }
 
-    // Runs a command that must succeed and loads the image it wrote.
+    // Runs a command that must succeed silently and loads the image it wrote.
     CImage RunForImage(const std::string& args, const std::string& outputFile = "out.png") {
         SCOPED_TRACE(args);
         EXPECT_EQ(Run(args), 0) << errors;
+        EXPECT_EQ(errors, "");
         CImage image;
         EXPECT_TRUE(image.ImportFile(Path(outputFile))) << outputFile;
         std::filesystem::remove(Path(outputFile));

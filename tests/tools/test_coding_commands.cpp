@@ -50,7 +50,11 @@ TEST_F(CodingCommands, BadInputIsRefused) {
     ExpectRefused("huffman", "--image or --histogram");
     // The tree of a Fibonacci-like histogram is deeper than 31 levels.
     std::string deep;
-    for (long long a = 1, b = 1, n = 0; n < 40; ++n, std::swap(a, b), b += a) deep += std::to_string(a) + " ";
+    for (long long a = 1, b = 1, n = 0; n < 40; ++n) {
+        deep += std::to_string(a) + " ";
+        b += a;
+        a = b - a;
+    }
     WriteText("deep.txt", deep);
     ExpectRefused("huffman --histogram deep.txt", "deeper than 31 levels");
 }
