@@ -92,7 +92,8 @@ void AddWarpAffineCommand(CLI::App& warp) {
         CImage dst(src.GetWidth(), src.GetHeight(), src.GetBitCount());
         CPoint corners[4];
         if (!WarpAffine(m.data(), src, dst, args->fit, args->shift.empty() ? nullptr : &shift, corners))
-            throw ToolError("--matrix: the map cannot be applied (singular with --fit, or the output window is empty)");
+            throw ToolError(std::string(args->shift.empty() ? "--matrix" : "--matrix with --shift") +
+                            ": the map cannot be applied (singular with --fit, or the output window is empty)");
         if (args->fit && dst.GetWidth() > 0) {
             std::printf("output %d x %d\n", dst.GetWidth(), dst.GetHeight());
             const char* names[4] = {"top-left", "top-right", "bottom-right", "bottom-left"};
