@@ -183,24 +183,6 @@ void CopyAverageBorder(const CImage& source, CImage& destination, int window) {
     }
 }
 
-// With an odd window the row height-1-h and the column width-1-h lie between the last
-// produced average and the copied border; they take the nearest produced average so that the
-// average image has no unwritten line.
-void FillOddWindowGap(CImage& destination, int window) {
-    const int half = window / 2;
-    const int width = destination.GetWidth();
-    const int height = destination.GetHeight();
-    const int gapRow = height - 1 - half;
-    const int gapColumn = width - 1 - half;
-    const unsigned char* above = Row(destination, gapRow - 1);
-    unsigned char* row = Row(destination, gapRow);
-    std::copy(above + half * 3, above + gapColumn * 3, row + half * 3);
-    for (int y = half; y <= gapRow; ++y) {
-        unsigned char* p = Row(destination, y) + static_cast<size_t>(gapColumn) * 3;
-        std::copy(p - 3, p, p);
-    }
-}
-
 }  // namespace
 }  // namespace holo
 
@@ -315,14 +297,10 @@ void CHologramsRemove::CalcAvImg_24(CImage& source, CImage& destination, int win
     const CImage* input = &source;
     CImage copy;
     if (&source == &destination) input = &(copy = source);
-    if (!holo::WindowFits(*input, window)) {
-        // No window fits: every pixel is border, copied from the source.
-        destination = *input;
-        return;
-    }
+    // With an odd window the window ending at the last row or column is not produced, so the row
+    // height-1-h and the column width-1-h keep the reallocated 0; callers' results rely on it.
     holo::BoxAverage(*input, destination, window);
     holo::CopyAverageBorder(*input, destination, window);
-    if (window % 2 == 1) holo::FillOddWindowGap(destination, window);
 }
 
 void CHologramsRemove::CalcAvImg_24_By_XY(CImage& profile, CImage& destination, int, int topRow, int bottomRow) {

@@ -126,14 +126,19 @@ TEST(TwoScaling, BoxAverageOfWindow28CopiesTheBorder) {
         }
 }
 
-TEST(TwoScaling, OddWindowGapTakesTheNearestAverage) {
+TEST(TwoScaling, OddWindowLeavesTheUnproducedRowAndColumnZero) {
     CHologramsRemove remover;
-    CImage src = RandomImage(23, 19, 24, 4);
+    CImage src = RandomImage(23, 19, 24, 4, 1, 255);
     CImage avg;
     remover.CalcAvImg_24(src, avg, 5);  // h = 2: row 16 and column 20 lie between averages and border
-    EXPECT_EQ(Px(avg, 10, 16), Px(avg, 10, 15));
-    EXPECT_EQ(Px(avg, 20, 9), Px(avg, 19, 9));
+    EXPECT_EQ(Px(avg, 10, 16), (std::vector<int>{0, 0, 0}));
+    EXPECT_EQ(Px(avg, 20, 9), (std::vector<int>{0, 0, 0}));
     EXPECT_EQ(Px(avg, 21, 9), Px(src, 21, 9));
+    EXPECT_NE(Px(avg, 19, 9), (std::vector<int>{0, 0, 0}));
+
+    CImage tall = RandomImage(30, 5, 24, 5, 1, 255);  // no window fits: border rules only
+    remover.CalcAvImg_24(tall, avg, 6);
+    EXPECT_TRUE(SamePixels(avg, tall));
 }
 
 // The running sums against direct window sums, both depths, odd and even sizes and windows.
