@@ -1,6 +1,7 @@
 // The neighbourhood-vote glare detectors, the thresholded grey difference, the gradient edge
 // classifier and the mask-clearing utility.
 
+#include <cstdint>
 #include <array>
 #include <cstdlib>
 #include <initializer_list>
@@ -248,7 +249,7 @@ void CHologramsRemove::MapHologramsEdges_24(CImage& gradient1, CImage& gradient2
         Refuse(name, "gradients and edge masks must be 24-bit images of one size"))
         return;
     if (border < 0 && Refuse(name, "negative border")) return;
-    const int t = threshold;
+    const int64_t t = threshold;  // 2 * t must not wrap for large thresholds
     const int width = gradient1.GetWidth();
     for (int y = border; y < gradient1.GetHeight() - border; ++y) {
         const unsigned char* g1 = Row(gradient1, y);

@@ -38,6 +38,12 @@ void SetError(std::string* error, const std::string& text) {
     if (error != nullptr) *error = text;
 }
 
+// A file header may claim any size; reading stops at 2^28 pixels (about 16 times an A4 page at
+// 300 dpi) so that a small crafted file cannot demand gigabytes.
+bool SizeAcceptable(uint64_t width, uint64_t height) {
+    return width > 0 && height > 0 && width <= 65535 && height <= 65535 && width * height <= (uint64_t(1) << 28);
+}
+
 // ---- BMP ----------------------------------------------------------------------------
 
 void Put16(std::vector<unsigned char>& b, uint16_t v) { b.push_back(v & 0xFF); b.push_back(v >> 8); }
@@ -91,7 +97,8 @@ bool ReadBmp(const std::string& path, CImage& out, std::string* error) {
     if (compression != 0) return SetError(error, "compressed BMP files are not supported"), false;
     if (bits != 8 && bits != 24 && bits != 32) return SetError(error, "BMP depth " + std::to_string(bits) + " is not supported"), false;
     const int height = rawHeight < 0 ? -rawHeight : rawHeight;
-    if (width <= 0 || height <= 0 || width > 100000 || height > 100000) return SetError(error, "bad BMP size"), false;
+    if (width <= 0 || !SizeAcceptable(static_cast<uint64_t>(width), static_cast<uint64_t>(height)))
+        return SetError(error, "BMP size out of range"), false;
     const size_t srcSpan = ((static_cast<size_t>(width) * bits / 8) + 3) & ~size_t(3);
     if (offset > data.size() || data.size() - offset < srcSpan * height) return SetError(error, "truncated BMP file"), false;
 
@@ -187,7 +194,7 @@ bool ReadPng(const std::string& path, CImage& out, std::string* error) {
     png_read_update_info(png, info);
     const int channels = png_get_channels(png, info);
     const png_uint_32 w = png_get_image_width(png, info), h = png_get_image_height(png, info);
-    if (w > 100000 || h > 100000 || (channels != 1 && channels != 3)) {
+    if (!SizeAcceptable(w, h) || (channels != 1 && channels != 3)) {
         png_destroy_read_struct(&png, &info, nullptr);
         return SetError(error, "unsupported PNG layout"), false;
     }
@@ -272,6 +279,10 @@ bool ReadJpeg(const std::string& path, CImage& out, std::string* error) {
     const bool grey = cinfo.num_components == 1;
     cinfo.out_color_space = grey ? JCS_GRAYSCALE : JCS_EXT_BGR;
     jpeg_start_decompress(&cinfo);
+    if (!SizeAcceptable(cinfo.output_width, cinfo.output_height)) {
+        jpeg_destroy_decompress(&cinfo);
+        return SetError(error, "JPEG size out of range"), false;
+    }
     img.Reallocate(static_cast<int>(cinfo.output_width), static_cast<int>(cinfo.output_height), grey ? 8 : 24);
     while (cinfo.output_scanline < cinfo.output_height) {
         JSAMPROW row = img.GetPtrXY(0, static_cast<int>(cinfo.output_scanline));
@@ -322,9 +333,9 @@ bool ReadTiff(const std::string& path, CImage& out, std::string* error) {
     TIFFGetFieldDefaulted(tif, TIFFTAG_BITSPERSAMPLE, &bps);
     TIFFGetFieldDefaulted(tif, TIFFTAG_SAMPLESPERPIXEL, &spp);
     TIFFGetFieldDefaulted(tif, TIFFTAG_PHOTOMETRIC, &photometric);
-    if (w == 0 || h == 0 || w > 100000 || h > 100000) {
+    if (!SizeAcceptable(w, h)) {
         TIFFClose(tif);
-        return SetError(error, "bad TIFF size"), false;
+        return SetError(error, "TIFF size out of range"), false;
     }
     CImage img;
     bool ok = true;
@@ -368,15 +379,19 @@ bool CImage::ExportFile(const wchar_t* path) const {
     if (path == nullptr) return false;
     const std::optional<std::string> target = imagelib::ResolveOutputPath(path);
     if (!target) return false;  // a debug dump with no dump directory: nothing to do
+    if (imagelib::IsDumpPath(path)) {
+        // Dumps name fixed folders ("results", "zentlogdir") that a fresh dump directory lacks.
+        std::error_code ec;
+        const std::filesystem::path parent = std::filesystem::path(*target).parent_path();
+        if (!parent.empty()) std::filesystem::create_directories(parent, ec);
+    }
     return ExportFile(*target);
 }
 
 bool CImage::ExportFile(const std::string& path) const {
     if (m_pixels == nullptr || path.empty()) return false;
     try {
-        const std::filesystem::path parent = std::filesystem::path(path).parent_path();
         std::error_code ec;
-        if (!parent.empty()) std::filesystem::create_directories(parent, ec);
         const bool ok = WriteByExtension(*this, path);
         if (!ok) std::filesystem::remove(path, ec);
         return ok;

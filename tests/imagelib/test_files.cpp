@@ -77,6 +77,19 @@ TEST_F(FileTest, ImportRefusesWhatItCannotRead) {
     EXPECT_EQ(img.GetWidth(), 3);  // unchanged on failure
     EXPECT_FALSE(img.ExportFile(Path("a.gif")));
     EXPECT_FALSE(fs::exists(Path("a.gif")));
+    EXPECT_FALSE(img.ExportFile(Path("no-such-folder/a.png")));  // plain paths get no folders made
+
+    // A header claiming 60000 x 60000 pixels is refused before anything is allocated.
+    ASSERT_TRUE(img.ExportFile(Path("huge.bmp")));
+    {
+        std::fstream f(Path("huge.bmp"), std::ios::in | std::ios::out | std::ios::binary);
+        const unsigned char size[4] = {0x60, 0xEA, 0, 0};
+        f.seekp(18);
+        f.write(reinterpret_cast<const char*>(size), 4);
+        f.write(reinterpret_cast<const char*>(size), 4);
+    }
+    EXPECT_FALSE(img.ImportFile(Path("huge.bmp"), &error));
+    EXPECT_NE(error.find("size"), std::string::npos);
 }
 
 TEST_F(FileTest, DumpPathsLandUnderTheDumpDirectoryOrNowhere) {

@@ -1,6 +1,8 @@
 // holo4: glare-free composites from four directionally lit shots.
 #include <algorithm>
+#include <cstdint>
 #include <cstdio>
+#include <filesystem>
 #include <stdexcept>
 #include <string>
 #include <memory>
@@ -152,9 +154,11 @@ void AddEdgesCommand(CLI::App& app) {
         if (args->direction != "h" && args->direction != "v" && args->direction != "both")
             throw ToolError("--direction must be h, v or both (got '" + args->direction + "')");
         if (args->border < 6) throw ToolError("--border must be at least 6, the reach of the vertical gradient");
+        if (args->threshold < 0 || args->threshold > 255)
+            throw ToolError("--threshold must be 0 to 255 (gradients are bytes centred on 128)");
         CImage image1, image2;
         LoadPair(args->image1, args->image2, image1, image2);
-        if (2 * args->border >= std::min(image1.GetWidth(), image1.GetHeight()))
+        if (2 * static_cast<int64_t>(args->border) >= std::min(image1.GetWidth(), image1.GetHeight()))
             throw ToolError("--border leaves nothing of the shots to compare");
         CHologramsRemove remover;
         CStopWatch watch;
@@ -166,7 +170,14 @@ void AddEdgesCommand(CLI::App& app) {
         if (args->direction != "h") remover.MapHologramsEdges_24(v1, v2, edges1, edges2, args->border, args->threshold);
         const double ms = watch.ElapsedMicro() / 1000.0;
         SaveImage(edges1, args->out);
-        if (!args->second.empty()) SaveImage(edges2, args->second);
+        if (args->second.empty()) return;
+        try {
+            SaveImage(edges2, args->second);
+        } catch (const ToolError&) {
+            std::error_code ignored;
+            std::filesystem::remove(args->out, ignored);  // both masks or neither
+            throw;
+        }
         std::printf("edges: %d x %d, marked sub-pixels shot 1 = %d, shot 2 = %d, %.1f ms -> %s\n", image1.GetWidth(),
                     image1.GetHeight(), CountMarkedBytes(edges1), CountMarkedBytes(edges2), ms, args->out.c_str());
     });
