@@ -80,6 +80,17 @@ void CImage::Set(unsigned char value) {
 
 bool CImage::Reallocate(int width, int height, int bits, int) {
     if (!IsSupportedDepth(bits)) return false;
+    if (m_pixels != nullptr && width > 0 && height > 0 &&
+        static_cast<size_t>(SpanFor(width, bits)) * static_cast<size_t>(height) == GetSize()) {
+        // The same number of bytes: clearing the buffer in place avoids returning it to the system
+        // and faulting fresh pages in again, which dominates operations that rebuild their output.
+        m_width = width;
+        m_height = height;
+        m_bits = bits;
+        m_span = SpanFor(width, bits);
+        std::memset(m_pixels, 0, GetSize());
+        return true;
+    }
     COLORREF* palette = std::exchange(m_palette, nullptr);
     std::free(m_pixels);
     m_pixels = nullptr;

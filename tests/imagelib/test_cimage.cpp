@@ -29,6 +29,10 @@ TEST(CImage, FreshAndReallocatedPixelsAreZero) {
     EXPECT_EQ(img.GetBitCount(), 8);
     for (size_t i = 0; i < img.GetSize(); ++i) ASSERT_EQ(img.GetBits()[i], 0);
     EXPECT_FALSE(img.Reallocate(4, 4, 32));
+    img.Set(5);
+    ASSERT_TRUE(img.Reallocate(4, 9, 8));  // the same number of bytes, another shape
+    EXPECT_EQ(img.GetSpan(), 4);
+    for (size_t i = 0; i < img.GetSize(); ++i) ASSERT_EQ(img.GetBits()[i], 0);
 }
 
 TEST(CImage, CopiesAreDeepAndMovesTransferThePixels) {
