@@ -176,7 +176,9 @@ bool ReadPng(const std::string& path, CImage& out, std::string* error) {
         png_destroy_read_struct(&png, nullptr, nullptr);
         return SetError(error, "out of memory"), false;
     }
+    // Everything with a destructor lives from before the jump point, so a jump back skips none.
     CImage img;
+    std::vector<png_bytep> rows;
     if (setjmp(png_jmpbuf(png))) {
         png_destroy_read_struct(&png, &info, nullptr);
         return SetError(error, "corrupt or unsupported PNG file"), false;
@@ -199,7 +201,7 @@ bool ReadPng(const std::string& path, CImage& out, std::string* error) {
         return SetError(error, "unsupported PNG layout"), false;
     }
     img.Reallocate(static_cast<int>(w), static_cast<int>(h), channels * 8);
-    std::vector<png_bytep> rows(h);
+    rows.resize(h);
     for (png_uint_32 y = 0; y < h; ++y) rows[y] = img.GetPtrXY(0, static_cast<int>(y));
     png_read_image(png, rows.data());
     png_read_end(png, nullptr);
