@@ -6,6 +6,7 @@
 #include <cstdio>
 // jpeglib.h needs FILE and size_t declared first.
 #include <jpeglib.h>
+#include <jerror.h>
 
 #include <algorithm>
 #include <csetjmp>
@@ -215,9 +216,16 @@ bool ReadPng(const std::string& path, CImage& out, std::string* error) {
 struct JpegError {
     jpeg_error_mgr mgr;
     std::jmp_buf jump;
+    bool truncated = false;
 };
 
 void JpegErrorExit(j_common_ptr cinfo) { std::longjmp(reinterpret_cast<JpegError*>(cinfo->err)->jump, 1); }
+
+// The decoder only warns when the data ends early and fills the rest with grey; a cut file is
+// refused instead of handing back an invented lower part.
+void JpegMessage(j_common_ptr cinfo, int level) {
+    if (level < 0 && cinfo->err->msg_code == JWRN_JPEG_EOF) reinterpret_cast<JpegError*>(cinfo->err)->truncated = true;
+}
 
 bool WriteJpeg(const CImage& img, const std::string& path) {
     if (img.GetBitCount() != 8 && img.GetBitCount() != 24) return false;
@@ -266,6 +274,7 @@ bool ReadJpeg(const std::string& path, CImage& out, std::string* error) {
     JpegError err;
     cinfo.err = jpeg_std_error(&err.mgr);
     err.mgr.error_exit = JpegErrorExit;
+    err.mgr.emit_message = JpegMessage;
     CImage img;
     if (setjmp(err.jump)) {
         jpeg_destroy_decompress(&cinfo);
@@ -292,6 +301,7 @@ bool ReadJpeg(const std::string& path, CImage& out, std::string* error) {
     }
     jpeg_finish_decompress(&cinfo);
     jpeg_destroy_decompress(&cinfo);
+    if (err.truncated) return SetError(error, "the JPEG file is cut short"), false;
     out = std::move(img);
     return true;
 }

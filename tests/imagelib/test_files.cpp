@@ -79,6 +79,14 @@ TEST_F(FileTest, ImportRefusesWhatItCannotRead) {
     EXPECT_FALSE(fs::exists(Path("a.gif")));
     EXPECT_FALSE(img.ExportFile(Path("no-such-folder/a.png")));  // plain paths get no folders made
 
+    // Files cut short are refused, whatever the format.
+    const CImage noise = RandomImage(40, 30, 24, 9);
+    for (const char* name : {"cut.png", "cut.jpg", "cut.bmp", "cut.tif"}) {
+        ASSERT_TRUE(noise.ExportFile(Path(name)));
+        fs::resize_file(Path(name), fs::file_size(Path(name)) / 2);
+        EXPECT_FALSE(img.ImportFile(Path(name), &error)) << name;
+    }
+
     // A header claiming 60000 x 60000 pixels is refused before anything is allocated.
     ASSERT_TRUE(img.ExportFile(Path("huge.bmp")));
     {
