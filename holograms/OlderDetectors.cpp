@@ -28,18 +28,10 @@ std::array<Offset, 12> VoteNeighbours(int radius) {
     return {{{-r, -r}, {0, -r}, {r, -r}, {-r, 0}, {r, 0}, {-r, r}, {0, r}, {r, r}, {-h, -h}, {h, -h}, {-h, h}, {h, h}}};
 }
 
-struct VoteImages {
-    CImage& image1;
-    CImage& average1;
-    CImage& image2;
-    CImage& average2;
-    CImage& map1;
-    CImage& map2;
-};
 
 // Inputs of one depth and geometry, maps that are not inputs. On success the maps are 8-bit of
 // image 1's size and clear.
-bool PrepareVote(const wchar_t* name, int bits, VoteImages& v, int radius, int& count1, int& count2) {
+bool PrepareVote(const wchar_t* name, int bits, ShotImages& v, int radius, int& count1, int& count2) {
     const std::initializer_list<const CImage*> inputs = {&v.image1, &v.average1, &v.image2, &v.average2};
     for (const CImage* input : inputs)
         if ((!HasDepth(*input, bits) || !SameGeometry(v.image1, *input)) &&
@@ -64,6 +56,15 @@ std::array<const unsigned char*, 12> NeighbourRows(const CImage& image, int y, c
     for (size_t k = 0; k < at.size(); ++k) rows[k] = Row(image, y + at[k].dy);
     return rows;
 }
+
+// Row y of the shots, averages and maps, and the neighbour rows of the shots and averages.
+struct VoteRows : ShotRows {
+    std::array<const unsigned char*, 12> n1, n2, na1, na2;
+
+    VoteRows(const ShotImages& s, int y, const std::array<Offset, 12>& at)
+        : ShotRows(s, y), n1(NeighbourRows(s.image1, y, at)), n2(NeighbourRows(s.image2, y, at)),
+          na1(NeighbourRows(s.average1, y, at)), na2(NeighbourRows(s.average2, y, at)) {}
+};
 
 struct Verdict {
     bool candidate1, candidate2, bright1, bright2;
@@ -106,47 +107,38 @@ void CHologramsRemove::SubImg_8(CImage& image1, CImage& image2, CImage& output, 
 void CHologramsRemove::FindHologramsPixels_8(CImage& image1, CImage& average1, CImage& image2, CImage& average2,
                                              CImage& map1, CImage& map2, int radius, int topRow, int bottomRow,
                                              int& count1, int& count2) {
-    holo::VoteImages v{image1, average1, image2, average2, map1, map2};
+    holo::ShotImages v{image1, average1, image2, average2, map1, map2};
     if (!holo::PrepareVote(L"FindHologramsPixels_8", 8, v, radius, count1, count2)) return;
     const auto at = holo::VoteNeighbours(radius);
     const int height = image1.GetHeight();
     const int span = image1.GetSpan();  // the padding of each row takes part like pixels
     for (int y = radius; y < height - radius; ++y) {
-        const unsigned char* i1 = Row(image1, y);
-        const unsigned char* i2 = Row(image2, y);
-        const unsigned char* a1 = Row(average1, y);
-        const unsigned char* a2 = Row(average2, y);
-        unsigned char* m1 = Row(map1, y);
-        unsigned char* m2 = Row(map2, y);
-        const auto n1 = holo::NeighbourRows(image1, y, at);
-        const auto n2 = holo::NeighbourRows(image2, y, at);
-        const auto na1 = holo::NeighbourRows(average1, y, at);
-        const auto na2 = holo::NeighbourRows(average2, y, at);
+        const holo::VoteRows r(v, y, at);
         for (int x = radius; x < span - radius; ++x) {
-            const int p1 = i1[x];
-            const int p2 = i2[x];
+            const int p1 = r.i1[x];
+            const int p2 = r.i2[x];
             holo::Verdict v{};
-            v.candidate1 = p1 >= 96 && p2 - p1 < 8 && p1 - a1[x] > 10;
-            v.candidate2 = p2 >= 96 && p1 - p2 < 8 && p2 - a2[x] > 10;
+            v.candidate1 = p1 >= 96 && p2 - p1 < 8 && p1 - r.a1[x] > 10;
+            v.candidate2 = p2 >= 96 && p1 - p2 < 8 && p2 - r.a2[x] > 10;
             if (!v.candidate1 && !v.candidate2) continue;
             bool aborted = false;
             for (size_t k = 0; k < at.size() && !aborted; ++k) {
                 const int nx = x + at[k].dx;
-                const int e1 = p1 - n1[k][nx];
-                const int e2 = p2 - n2[k][nx];
-                if (p1 - na1[k][nx] > 10) ++v.votes1;
-                if (p2 - na2[k][nx] > 10) ++v.votes2;
+                const int e1 = p1 - r.n1[k][nx];
+                const int e2 = p2 - r.n2[k][nx];
+                if (p1 - r.na1[k][nx] > 10) ++v.votes1;
+                if (p2 - r.na2[k][nx] > 10) ++v.votes2;
                 aborted = (p1 >= 161 && e1 > 128) || (p2 >= 161 && e2 > 128);
                 if (!aborted && std::abs(e1 - e2) < 20) ++v.similar;
             }
             if (aborted) {
-                m1[x] = 0;
-                m2[x] = 0;
+                r.m1[x] = 0;
+                r.m2[x] = 0;
                 continue;
             }
             v.bright1 = p1 >= 240 && p2 <= 230;
             v.bright2 = p2 >= 240 && p1 <= 230;
-            holo::MarkVerdict(v, m1[x], m2[x], topRow < y && y < bottomRow, count1, count2);
+            holo::MarkVerdict(v, r.m1[x], r.m2[x], topRow < y && y < bottomRow, count1, count2);
         }
     }
     Trace(L"img1HologramPixels=%4d  - img2HologramPixels=%4d\n", count1, count2);
@@ -155,38 +147,29 @@ void CHologramsRemove::FindHologramsPixels_8(CImage& image1, CImage& average1, C
 void CHologramsRemove::FindHologramsPixels_24(CImage& image1, CImage& average1, CImage& image2, CImage& average2,
                                               CImage& map1, CImage& map2, int radius, int topRow, int bottomRow,
                                               int& count1, int& count2) {
-    holo::VoteImages v{image1, average1, image2, average2, map1, map2};
+    holo::ShotImages v{image1, average1, image2, average2, map1, map2};
     if (!holo::PrepareVote(L"FindHologramsPixels_24", 24, v, radius, count1, count2)) return;
     const auto at = holo::VoteNeighbours(radius);
     const int height = image1.GetHeight();
     const int span = image1.GetSpan();  // the padding of each row takes part like sub-pixels
     for (int y = radius; y < height - radius; ++y) {
-        const unsigned char* i1 = Row(image1, y);
-        const unsigned char* i2 = Row(image2, y);
-        const unsigned char* a1 = Row(average1, y);
-        const unsigned char* a2 = Row(average2, y);
-        unsigned char* m1 = Row(map1, y);
-        unsigned char* m2 = Row(map2, y);
-        const auto n1 = holo::NeighbourRows(image1, y, at);
-        const auto n2 = holo::NeighbourRows(image2, y, at);
-        const auto na1 = holo::NeighbourRows(average1, y, at);
-        const auto na2 = holo::NeighbourRows(average2, y, at);
+        const holo::VoteRows r(v, y, at);
         for (int i = 3 * radius; i < span - 3 * radius; ++i) {
             const int pixel = i / 3;  // the three channels share one mask byte
-            const int p1 = i1[i];
-            const int p2 = i2[i];
+            const int p1 = r.i1[i];
+            const int p2 = r.i2[i];
             holo::Verdict v{};
-            v.candidate1 = p1 >= 96 && p2 - p1 < 8 && p1 - a1[i] > 20;
-            v.candidate2 = p2 >= 96 && p1 - p2 < 8 && p2 - a2[i] > 20;
+            v.candidate1 = p1 >= 96 && p2 - p1 < 8 && p1 - r.a1[i] > 20;
+            v.candidate2 = p2 >= 96 && p1 - p2 < 8 && p2 - r.a2[i] > 20;
             if (!v.candidate1 && !v.candidate2) continue;
             bool aborted = false;
             int steep1 = 0, steep2 = 0;
             for (size_t k = 0; k < at.size() && !aborted; ++k) {
                 const int ni = i + 3 * at[k].dx;
-                const int e1 = p1 - n1[k][ni];
-                const int e2 = p2 - n2[k][ni];
-                const int local1 = p1 - na1[k][ni];
-                const int local2 = p2 - na2[k][ni];
+                const int e1 = p1 - r.n1[k][ni];
+                const int e2 = p2 - r.n2[k][ni];
+                const int local1 = p1 - r.na1[k][ni];
+                const int local2 = p2 - r.na2[k][ni];
                 if (local1 > 10) ++v.votes1;
                 if (local2 > 10) ++v.votes2;
                 if (p1 >= 161 && e1 >= 129) ++steep1;
@@ -195,14 +178,14 @@ void CHologramsRemove::FindHologramsPixels_24(CImage& image1, CImage& average1, 
                 if (!aborted && std::abs(local1 - local2) < 30) ++v.similar;
             }
             if (aborted) {
-                m1[pixel] = 0;
-                m2[pixel] = 0;
+                r.m1[pixel] = 0;
+                r.m2[pixel] = 0;
                 i = 3 * pixel + 2;  // skip the pixel's remaining channels
                 continue;
             }
             v.bright1 = p1 >= 240 && p2 <= 230;
             v.bright2 = p2 >= 240 && p1 <= 230;
-            holo::MarkVerdict(v, m1[pixel], m2[pixel], topRow < y && y < bottomRow, count1, count2);
+            holo::MarkVerdict(v, r.m1[pixel], r.m2[pixel], topRow < y && y < bottomRow, count1, count2);
         }
     }
     Trace(L"img1HologramPixels=%4d  - img2HologramPixels=%4d\n", count1, count2);

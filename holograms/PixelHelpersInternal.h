@@ -47,6 +47,30 @@ inline const unsigned char* Row(const CImage& image, int y) {
     return image.GetBits() + static_cast<size_t>(image.GetHeight() - 1 - y) * image.GetSpan();
 }
 
+// Two shots, their local averages and one output map per shot.
+struct ShotImages {
+    CImage& image1;
+    CImage& average1;
+    CImage& image2;
+    CImage& average2;
+    CImage& map1;
+    CImage& map2;
+};
+
+// Row y of each of the six images.
+struct ShotRows {
+    const unsigned char* i1;
+    const unsigned char* a1;
+    const unsigned char* i2;
+    const unsigned char* a2;
+    unsigned char* m1;
+    unsigned char* m2;
+
+    ShotRows(const ShotImages& s, int y)
+        : i1(Row(s.image1, y)), a1(Row(s.average1, y)), i2(Row(s.image2, y)), a2(Row(s.average2, y)),
+          m1(Row(s.map1, y)), m2(Row(s.map2, y)) {}
+};
+
 // One trace line naming the operation and why it did nothing; always returns true so that
 // callers can write `if (bad && Refuse(...)) return;`.
 inline bool Refuse(const wchar_t* operation, const char* reason) {
