@@ -210,18 +210,14 @@ void CHologramsRemove::FindHologramsPixels_24_New_Alg2(CImage& image1, CImage& a
     map2.Reallocate(width, height, 24, 0);
 
     // Pre-masks: sub-pixels well above their own average.
+    const holo::ShotImages shots{image1, average1, image2, average2, map1, map2};
     for (int y = half; y < height - half; ++y) {
-        const unsigned char* i1 = Row(image1, y);
-        const unsigned char* a1 = Row(average1, y);
-        const unsigned char* i2 = Row(image2, y);
-        const unsigned char* a2 = Row(average2, y);
-        unsigned char* m1 = Row(map1, y);
-        unsigned char* m2 = Row(map2, y);
+        const holo::ShotRows r(shots, y);
         for (int i = 3 * half; i < 3 * (width - half); ++i) {
-            const int d1 = i1[i] - a1[i];
-            const int d2 = i2[i] - a2[i];
-            m1[i] = static_cast<unsigned char>(d1 > 20 ? d1 : 0);
-            m2[i] = static_cast<unsigned char>(d2 > 20 ? d2 : 0);
+            const int d1 = r.i1[i] - r.a1[i];
+            const int d2 = r.i2[i] - r.a2[i];
+            r.m1[i] = static_cast<unsigned char>(d1 > 20 ? d1 : 0);
+            r.m2[i] = static_cast<unsigned char>(d2 > 20 ? d2 : 0);
         }
     }
     FixAvMap_24(image1, average1, map1, window, 20);
@@ -232,26 +228,21 @@ void CHologramsRemove::FindHologramsPixels_24_New_Alg2(CImage& image1, CImage& a
     const int high = m_avDifVal + 10;
     const int low = m_avDifVal - 10;
     for (int y = half; y < height - half; ++y) {
-        const unsigned char* i1 = Row(image1, y);
-        const unsigned char* a1 = Row(average1, y);
-        const unsigned char* i2 = Row(image2, y);
-        const unsigned char* a2 = Row(average2, y);
+        const holo::ShotRows r(shots, y);
         const unsigned char* d = Row(difference, y);
-        unsigned char* m1 = Row(map1, y);
-        unsigned char* m2 = Row(map2, y);
         for (int i = 3 * half; i < 3 * (width - half); ++i) {
-            m1[i] = 0;
-            m2[i] = 0;
-            const int d1 = i1[i] - a1[i];
-            const int d2 = i2[i] - a2[i];
+            r.m1[i] = 0;
+            r.m2[i] = 0;
+            const int d1 = r.i1[i] - r.a1[i];
+            const int d2 = r.i2[i] - r.a2[i];
             // The excess can reach 510; it saturates so that a strong mark never wraps to 0.
             if (d1 > 10 && d1 - d2 > 30 && d[i] > high) {
                 ++count1;
-                m1[i] = holo::ClampByte(d1 - d2);
+                r.m1[i] = holo::ClampByte(d1 - d2);
             }
             if (d2 > 10 && d2 - d1 > 30 && d[i] < low) {
                 ++count2;
-                m2[i] = holo::ClampByte(d2 - d1);
+                r.m2[i] = holo::ClampByte(d2 - d1);
             }
         }
     }
