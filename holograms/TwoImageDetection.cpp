@@ -61,6 +61,12 @@ bool BuildDifference(const wchar_t* name, CImage& image1, CImage& image2, CImage
     return true;
 }
 
+// The row and column profiles of the difference and of both shots, in that order.
+void AddProfiles(CHologramsRemove& self, std::initializer_list<CImage*> images, int border, int topRow,
+                 int bottomRow) {
+    for (CImage* image : images) self.CalcImg_HV_Av_24(*image, border, topRow, bottomRow);
+}
+
 // Tolerance of the glare test for one channel: lower near saturation, where an excess cannot grow.
 inline int Tolerance(int value) { return value > 240 ? 270 - value : 30; }
 
@@ -71,11 +77,7 @@ void CHologramsRemove::SubImg_24(CImage& image1, CImage& image2, CImage& differe
                                  int& referenceMean, float gain, int topRow, int bottomRow) {
     holo::DifferenceStats stats;
     if (!holo::BuildDifference(L"SubImg_24", image1, image2, difference, border, gain, stats)) return;
-    if (profiles) {
-        CalcImg_HV_Av_24(difference, border, topRow, bottomRow);
-        CalcImg_HV_Av_24(image1, border, topRow, bottomRow);
-        CalcImg_HV_Av_24(image2, border, topRow, bottomRow);
-    }
+    if (profiles) holo::AddProfiles(*this, {&difference, &image1, &image2}, border, topRow, bottomRow);
     referenceMean = 128;
     if (stats.count >= 11) referenceMean = static_cast<int>(stats.valueSum / stats.count);
 }
@@ -84,11 +86,7 @@ void CHologramsRemove::SubImg_24_Alg3(CImage& image1, CImage& image2, CImage& di
                                       float gain, int topRow, int bottomRow) {
     holo::DifferenceStats stats;
     if (!holo::BuildDifference(L"SubImg_24_Alg3", image1, image2, difference, border, gain, stats)) return;
-    if (profiles) {
-        CalcImg_HV_Av_24(difference, border, topRow, bottomRow);
-        CalcImg_HV_Av_24(image1, border, topRow, bottomRow);
-        CalcImg_HV_Av_24(image2, border, topRow, bottomRow);
-    }
+    if (profiles) holo::AddProfiles(*this, {&difference, &image1, &image2}, border, topRow, bottomRow);
     m_avDifVal = 128;
     m_avDif = 0;
     if (stats.count >= 11) {
