@@ -57,9 +57,9 @@ void AddIrCommand(CLI::App& app) {
         std::string out;
     };
     auto args = std::make_shared<Args>();
-    CLI::App* cmd = app.add_subcommand(
-        "ir", std::string("Synthetic infrared picture: plane 0 with small features dark in planes 0 and 1 "
-                          "darkened further. ") + kPlaneOrder);
+    CLI::App* cmd = app.add_subcommand("ir", "Synthetic infrared picture from the colour planes");
+    cmd->footer(std::string("Plane 0 with small features that are dark in planes 0 and 1 darkened further. ") +
+                kPlaneOrder);
     AddPlaneOptions(cmd, *args);
     cmd->add_option("-o,--output", args->out, "Output grey image")->required();
     cmd->callback([args] {
@@ -110,12 +110,13 @@ void AddMatchChannelsCommand(CLI::App& app) {
         bool json = false;
     };
     auto args = std::make_shared<Args>();
-    CLI::App* cmd = app.add_subcommand(
-        "match-channels",
-        std::string("Find the dark strokes of plane 1 and report, per stroke segment, its box (inclusive), its "
-                    "number of sampled points and the offset dx,dy at which plane 0 and plane 2 best match "
-                    "plane 1 (none when a point lies less than 12 pixels from the border, or nothing was graded). ") +
-            kPlaneOrder);
+    CLI::App* cmd =
+        app.add_subcommand("match-channels", "How well colour planes 0 and 2 line up with plane 1, per stroke");
+    cmd->footer(std::string("Finds the dark strokes of plane 1 and reports, per stroke segment, its box (inclusive), "
+                            "its number of sampled points and the offset dx,dy at which plane 0 and plane 2 best "
+                            "match plane 1 (none when a point lies less than 12 pixels from the border, or nothing "
+                            "was graded). ") +
+                kPlaneOrder);
     AddPlaneOptions(cmd, *args);
     cmd->add_option("--dump-dir", args->dumpDir, "Write the debug pictures (groups, maps) under this directory");
     cmd->add_flag("--json", args->json, "Print the segments as JSON");

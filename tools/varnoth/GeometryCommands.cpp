@@ -148,9 +148,10 @@ void AddSeamCommand(CLI::App& app) {
     };
     auto args = std::make_shared<Args>();
     CLI::App* cmd = app.add_subcommand(
-        "seam",
-        "Straighten the join of a two-sensor scan along the curve y = q0*x^2 + q1*x + q2 measured over columns "
-        "x0 to x1, then rotate by --angle degrees and turn a quarter clockwise.");
+        "seam", "Straighten the seam of a two-sensor scan, then rotate it");
+    cmd->footer(
+        "Straightens the join along the curve y = q0*x^2 + q1*x + q2 measured over columns x0 to x1, then rotates "
+        "by --angle degrees and turns the result a quarter clockwise.");
     cmd->add_option("IN", args->in, "Input image (8- or 24-bit)")->required();
     cmd->add_option("-o,--output", args->out, "Output image")->required();
     cmd->add_option("--curve", args->curve, "Seam curve q0,q1,q2")->required();
@@ -178,9 +179,10 @@ void AddHillsCommand(CLI::App& app) {
     };
     auto args = std::make_shared<Args>();
     CLI::App* cmd = app.add_subcommand(
-        "hills",
-        "Three-level rendering of a grey image row by row: 200 after a strong rising edge, 0 after a strong "
-        "falling edge, 100 before the first and from the last edge. Colour input is converted to grey.");
+        "hills", "Three-level (hills-and-valleys) rendering of a grey image");
+    cmd->footer(
+        "Row by row: 200 after a strong rising edge, 0 after a strong falling edge, 100 before the first and from "
+        "the last edge. Colour input is converted to grey.");
     cmd->add_option("IN", args->in, "Input image")->required();
     cmd->add_option("-o,--output", args->out, "Output 8-bit image")->required();
     cmd->add_option("--threshold", args->threshold, "Smallest derivative magnitude of an edge, exclusive")->required();
