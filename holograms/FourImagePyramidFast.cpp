@@ -10,14 +10,11 @@
 
 #include "holograms/FourImageInternal.h"
 #include "holograms/FourImagePyramidInternal.h"
+#include "holograms/FourImageVectorInternal.h"
 
 HWY_BEFORE_NAMESPACE();
 namespace holo4 {
 namespace HWY_NAMESPACE {
-namespace hn = hwy::HWY_NAMESPACE;
-
-using D8 = hn::ScalableTag<uint8_t>;
-using V8 = hn::Vec<D8>;
 
 struct Candidates {
     V8 b[4], g[4], r[4];
@@ -39,22 +36,14 @@ void BrightnessRowVector(const unsigned char* pixels, unsigned char* out, int wi
     const D8 d;
     const int lanes = static_cast<int>(hn::Lanes(d));
     int x = 0;
-    for (; x + lanes <= width; x += lanes) {
-        V8 b, g, r;
-        hn::LoadInterleaved3(d, pixels + 3 * x, b, g, r);
-        hn::StoreU(hn::Max(hn::Max(b, g), r), d, out + x);
-    }
+    for (; x + lanes <= width; x += lanes) hn::StoreU(LargestChannel(d, pixels + 3 * x), d, out + x);
     BrightnessRow(pixels, out, x, width);
 }
-
-// a >= threshold for unsigned bytes
-hn::Mask<D8> AtLeast(const D8 d, V8 a, uint8_t threshold) { return hn::Eq(hn::Max(a, hn::Set(d, threshold)), a); }
 
 void ComposeRowVector(const unsigned char* const lap[4], const unsigned char* const bright[4], unsigned char* out,
                       int width) {
     const D8 d;
     const int lanes = static_cast<int>(hn::Lanes(d));
-    uint8_t bits[HWY_MAX_BYTES / 8 + 8];
     int x = 0;
     for (; x + lanes <= width; x += lanes) {
         const Candidates c = Load(d, lap, bright, x);
@@ -66,17 +55,11 @@ void ComposeRowVector(const unsigned char* const lap[4], const unsigned char* co
         const auto copyLargest = hn::Not(hn::Or(anySaturated, wideSpread));
         if (!hn::AllFalse(d, copyLargest)) {
             // The earliest candidate holding the largest peak.
-            const auto is0 = hn::Eq(c.peak[0], largest), is1 = hn::Eq(c.peak[1], largest),
-                       is2 = hn::Eq(c.peak[2], largest);
-            auto pick = [&](const V8* ch) {
-                return hn::IfThenElse(is0, ch[0], hn::IfThenElse(is1, ch[1], hn::IfThenElse(is2, ch[2], ch[3])));
-            };
-            hn::StoreInterleaved3(pick(c.b), pick(c.g), pick(c.r), d, out + 3 * x);
+            StorePicked(d, hn::Eq(c.peak[0], largest), hn::Eq(c.peak[1], largest), hn::Eq(c.peak[2], largest), c.b,
+                        c.g, c.r, out + 3 * x);
         }
-        if (hn::AllTrue(d, copyLargest)) continue;
-        hn::StoreMaskBits(d, copyLargest, bits);
-        for (int j = 0; j < lanes; ++j)
-            if (!(bits[j >> 3] & (1u << (j & 7)))) ComposePixels(lap, bright, out, x + j, x + j + 1);
+        RedoUnhandledLanes(d, copyLargest, x,
+                           [&](int begin, int end) { ComposePixels(lap, bright, out, begin, end); });
     }
     ComposePixels(lap, bright, out, x, width);
 }

@@ -9,20 +9,11 @@
 
 #include "holograms/FourImagePyramidInternal.h"
 #include "holograms/FourImageStepsInternal.h"
+#include "holograms/FourImageVectorInternal.h"
 
 HWY_BEFORE_NAMESPACE();
 namespace holo4 {
 namespace HWY_NAMESPACE {
-namespace hn = hwy::HWY_NAMESPACE;
-
-using D8 = hn::ScalableTag<uint8_t>;
-using V8 = hn::Vec<D8>;
-
-V8 LargestChannel(const D8 d, const unsigned char* pixels) {
-    V8 b, g, r;
-    hn::LoadInterleaved3(d, pixels, b, g, r);
-    return hn::Max(hn::Max(b, g), r);
-}
 
 void FoldRowVector(uint8_t* const map[9], int step, const unsigned char* bright, const unsigned char* detail,
                    int width) {
@@ -36,7 +27,7 @@ void FoldRowVector(uint8_t* const map[9], int step, const unsigned char* bright,
         const V8 p = LargestChannel(d, detail + 3 * x);
 
         V8 sat = hn::LoadU(d, map[0] + x);
-        const auto saturated = hn::Eq(hn::Max(g, hn::Set(d, kSaturatedBrightness)), g);
+        const auto saturated = AtLeast(d, g, kSaturatedBrightness);
         const auto count = hn::And(saturated, hn::Eq(hn::And(sat, flag), hn::Zero(d)));
         sat = hn::IfThenElse(count, hn::Or(hn::Add(sat, hn::Set(d, 1)), flag), sat);
         hn::StoreU(sat, d, map[0] + x);
@@ -63,7 +54,6 @@ void FoldRowVector(uint8_t* const map[9], int step, const unsigned char* bright,
 void DecideRowVector(uint8_t* const map[9], const unsigned char* const detail[4], unsigned char* out, int width) {
     const D8 d;
     const int lanes = static_cast<int>(hn::Lanes(d));
-    uint8_t bits[HWY_MAX_BYTES / 8 + 8];
     int x = 0;
     for (; x + lanes <= width; x += lanes) {
         const V8 sat = hn::LoadU(d, map[0] + x);
@@ -78,17 +68,10 @@ void DecideRowVector(uint8_t* const map[9], const unsigned char* const detail[4]
                 hn::IfThenElse(minFarther, hn::LoadU(d, map[8] + x), hn::LoadU(d, map[6] + x)), hn::Set(d, 3));
             V8 b[4], g[4], r[4];
             for (int i = 0; i < 4; ++i) hn::LoadInterleaved3(d, detail[i] + 3 * x, b[i], g[i], r[i]);
-            const auto is0 = hn::Eq(index, hn::Zero(d)), is1 = hn::Eq(index, hn::Set(d, 1)),
-                       is2 = hn::Eq(index, hn::Set(d, 2));
-            auto pick = [&](const V8* ch) {
-                return hn::IfThenElse(is0, ch[0], hn::IfThenElse(is1, ch[1], hn::IfThenElse(is2, ch[2], ch[3])));
-            };
-            hn::StoreInterleaved3(pick(b), pick(g), pick(r), d, out + 3 * x);
+            StorePicked(d, hn::Eq(index, hn::Zero(d)), hn::Eq(index, hn::Set(d, 1)), hn::Eq(index, hn::Set(d, 2)), b,
+                        g, r, out + 3 * x);
         }
-        if (hn::AllTrue(d, copyPeak)) continue;
-        hn::StoreMaskBits(d, copyPeak, bits);
-        for (int j = 0; j < lanes; ++j)
-            if (!(bits[j >> 3] & (1u << (j & 7)))) DecidePixels(map, detail, out, x + j, x + j + 1);
+        RedoUnhandledLanes(d, copyPeak, x, [&](int begin, int end) { DecidePixels(map, detail, out, begin, end); });
     }
     DecidePixels(map, detail, out, x, width);
 }
