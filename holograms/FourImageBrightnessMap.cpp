@@ -103,7 +103,14 @@ void CopyEdgePair(const unsigned char* edgeRow, const unsigned char* sideRow, un
     std::memcpy(out + 3 * firstPixel, src + 3 * firstPixel, 6);
 }
 
-// Candidate rows at (x, y): the pixels, their left neighbours and the pixels above.
+// The four candidates' pixels at (x, y), their left neighbours and the pixels above.
+struct CandidatePixels {
+    const unsigned char* at[4];
+    const unsigned char* leftOf[4];
+    const unsigned char* up[4];
+};
+
+// Candidate rows y and y - 1.
 struct CandidateRows {
     const unsigned char* row[4];
     const unsigned char* above[4];
@@ -114,13 +121,28 @@ struct CandidateRows {
             above[i] = in[i]->GetPtrXY(0, y - 1);
         }
     }
-    void At(int x, const unsigned char* at[4], const unsigned char* leftOf[4], const unsigned char* up[4]) const {
+    CandidatePixels At(int x) const {
+        CandidatePixels p;
         for (int i = 0; i < 4; ++i) {
-            at[i] = row[i] + 3 * x;
-            leftOf[i] = at[i] - 3;
-            up[i] = above[i] + 3 * x;
+            p.at[i] = row[i] + 3 * x;
+            p.leftOf[i] = p.at[i] - 3;
+            p.up[i] = above[i] + 3 * x;
         }
+        return p;
     }
+};
+
+// Result row y, the finished result row above it and brightness-map row y.
+struct ResultRows {
+    unsigned char* row;
+    const unsigned char* above;
+    unsigned char* map;
+
+    ResultRows(CImage& out, CImage& brightMap, int y)
+        : row(out.GetPtrXY(0, y)), above(out.GetPtrXY(0, y - 1)), map(brightMap.GetPtrXY(0, y)) {}
+    unsigned char* At(int x) const { return row + 3 * x; }
+    const unsigned char* LeftOf(int x) const { return row + 3 * x - 3; }
+    const unsigned char* Above(int x) const { return above + 3 * x; }
 };
 
 // Inner row y: the two edge pairs, which depend on the inputs only.
@@ -151,13 +173,10 @@ void ComposeBrightnessMapPlain(const CImage* const in[4], CImage& out, CImage& b
     for (int y = 2; y <= h - 3; ++y) {
         CopyEdges(in, out, y);
         const CandidateRows rows(in, y);
-        unsigned char* outRow = out.GetPtrXY(0, y);
-        const unsigned char* outAbove = out.GetPtrXY(0, y - 1);
-        unsigned char* mapRow = brightMap.GetPtrXY(0, y);
+        const ResultRows result(out, brightMap, y);
         for (int x = 2; x <= w - 3; ++x) {
-            const unsigned char *at[4], *leftOf[4], *up[4];
-            rows.At(x, at, leftOf, up);
-            RebuildPixel(at, leftOf, up, outRow + 3 * x - 3, outAbove + 3 * x, outRow + 3 * x, mapRow + x);
+            const CandidatePixels p = rows.At(x);
+            RebuildPixel(p.at, p.leftOf, p.up, result.LeftOf(x), result.Above(x), result.At(x), result.map + x);
         }
     }
 }
@@ -179,23 +198,18 @@ void ComposeBrightnessMapFast(const CImage* const in[4], CImage& out, CImage& br
                 const CandidateRows rows(in, y);
                 PixelAnalysis* a = analysis.data() + static_cast<size_t>(y - first) * inner;
                 for (int x = 2; x <= w - 3; ++x) {
-                    const unsigned char *at[4], *leftOf[4], *up[4];
-                    rows.At(x, at, leftOf, up);
-                    AnalysePixel(at, leftOf, up, a[x - 2]);
+                    const CandidatePixels p = rows.At(x);
+                    AnalysePixel(p.at, p.leftOf, p.up, a[x - 2]);
                 }
             }
         }, 4);
         for (int y = first; y < last; ++y) {
             const CandidateRows rows(in, y);
+            const ResultRows result(out, brightMap, y);
             const PixelAnalysis* a = analysis.data() + static_cast<size_t>(y - first) * inner;
-            unsigned char* outRow = out.GetPtrXY(0, y);
-            const unsigned char* outAbove = out.GetPtrXY(0, y - 1);
-            unsigned char* mapRow = brightMap.GetPtrXY(0, y);
             for (int x = 2; x <= w - 3; ++x) {
-                const unsigned char *at[4], *leftOf[4], *up[4];
-                rows.At(x, at, leftOf, up);
-                mapRow[x] = a[x - 2].flags;
-                FinishPixel(a[x - 2], at, outRow + 3 * x - 3, outAbove + 3 * x, outRow + 3 * x);
+                result.map[x] = a[x - 2].flags;
+                FinishPixel(a[x - 2], rows.At(x).at, result.LeftOf(x), result.Above(x), result.At(x));
             }
         }
     }
