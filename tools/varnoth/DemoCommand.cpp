@@ -8,6 +8,7 @@
 #include <vector>
 
 #include "imagelib/StopWatch.h"
+#include "scene/Ranking.h"
 #include "scene/Scene.h"
 #include "varnoth/Commands.h"
 #include "varnoth/FourImageMethods.h"
@@ -20,13 +21,6 @@ struct DemoArgs {
     std::string outDir = "varnoth-demo";
     std::string size = "1240x1754";
     uint32_t seed = 1;
-};
-
-struct Outcome {
-    std::string name;
-    double ms;
-    scene::Quality quality;
-    CImage result;
 };
 
 void ParseSize(const std::string& text, int& w, int& h) {
@@ -110,10 +104,10 @@ void RunDemo(const DemoArgs& args) {
     SaveImage(s.truth, dir + "truth.png");
 
     const CImage* const shots[4] = {&s.shots[0], &s.shots[1], &s.shots[2], &s.shots[3]};
-    std::vector<Outcome> outcomes;
+    std::vector<scene::Outcome> outcomes;
     for (const FourImageMethod& method : FourImageMethods()) {
         CHologramsRemove remover;
-        Outcome o{method.name, 0.0, {}, CImage()};
+        scene::Outcome o{method.name, 0.0, {}, CImage()};
         watch.Start();
         method.run(remover, shots, o.result);
         o.ms = watch.ElapsedMicro() / 1000.0;
@@ -122,17 +116,11 @@ void RunDemo(const DemoArgs& args) {
         outcomes.push_back(std::move(o));
     }
     // Best first: higher PSNR, then less glare left.
-    std::sort(outcomes.begin(), outcomes.end(), [](const Outcome& a, const Outcome& b) {
+    std::sort(outcomes.begin(), outcomes.end(), [](const scene::Outcome& a, const scene::Outcome& b) {
         if (a.quality.psnr != b.quality.psnr) return a.quality.psnr > b.quality.psnr;
         return a.quality.glareRemaining < b.quality.glareRemaining;
     });
-    std::printf("\nFour-image glare removal, best first:\n");
-    std::printf("  %-4s %-12s %10s %10s %16s\n", "rank", "method", "time ms", "PSNR dB", "glare left %");
-    for (size_t i = 0; i < outcomes.size(); ++i) {
-        const Outcome& o = outcomes[i];
-        std::printf("  %-4zu %-12s %10.1f %10.2f %16.2f\n", i + 1, o.name.c_str(), o.ms, o.quality.psnr,
-                    100.0 * o.quality.glareRemaining);
-    }
+    scene::PrintRanking("Four-image glare removal, best first:", outcomes);
     const std::string montage = dir + "montage.png";
     SaveImage(Montage(s, outcomes.front().result), montage);
     std::printf("\nWrote the shots, the truth and every result to %s\n", args.outDir.c_str());

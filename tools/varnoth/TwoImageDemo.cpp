@@ -5,18 +5,12 @@
 #include <vector>
 
 #include "imagelib/StopWatch.h"
+#include "scene/Ranking.h"
 #include "scene/TwoShotScene.h"
 #include "varnoth/ToolIO.h"
 #include "varnoth/TwoImageMethods.h"
 
 namespace {
-
-struct TwoOutcome {
-    std::string name;
-    double ms;
-    scene::Quality quality;
-    CImage result;
-};
 
 // shot 1 | shot 2 | result | truth, side by side.
 CImage TwoShotMontage(const scene::Scene& s, const CImage& result) {
@@ -45,28 +39,22 @@ void RunTwoImageDemo(const std::string& directory, int width, int height, uint32
                     q.psnr, 100.0 * q.glareRemaining);
     }
 
-    std::vector<TwoOutcome> outcomes;
+    std::vector<scene::Outcome> outcomes;
     for (const TwoImageMethod& method : TwoImageMethods()) {
         CHologramsRemove remover;
         CImage image1 = s.shots[0], image2 = s.shots[1];
         watch.Start();
         method.run(remover, image1, image2, 0, height);
-        TwoOutcome o{method.name, watch.ElapsedMicro() / 1000.0, scene::Evaluate(s, image1), std::move(image1)};
+        scene::Outcome o{method.name, watch.ElapsedMicro() / 1000.0, scene::Evaluate(s, image1), std::move(image1)};
         SaveImage(o.result, directory + "two_result_" + o.name + ".png");
         outcomes.push_back(std::move(o));
     }
-    std::sort(outcomes.begin(), outcomes.end(), [](const TwoOutcome& a, const TwoOutcome& b) {
+    std::sort(outcomes.begin(), outcomes.end(), [](const scene::Outcome& a, const scene::Outcome& b) {
         if (a.quality.glareRemaining != b.quality.glareRemaining)
             return a.quality.glareRemaining < b.quality.glareRemaining;
         return a.quality.psnr > b.quality.psnr;
     });
-    std::printf("\nTwo-image glare separation, least glare left first:\n");
-    std::printf("  %-4s %-12s %10s %10s %16s\n", "rank", "method", "time ms", "PSNR dB", "glare left %");
-    for (size_t i = 0; i < outcomes.size(); ++i) {
-        const TwoOutcome& o = outcomes[i];
-        std::printf("  %-4zu %-12s %10.1f %10.2f %16.2f\n", i + 1, o.name.c_str(), o.ms, o.quality.psnr,
-                    100.0 * o.quality.glareRemaining);
-    }
+    scene::PrintRanking("Two-image glare separation, least glare left first:", outcomes);
     const std::string montage = directory + "montage_two.png";
     SaveImage(TwoShotMontage(s, outcomes.front().result), montage);
     std::printf("%s: shot 1 | shot 2 | the result with least glare left (%s) | the truth\n", montage.c_str(),
