@@ -4,6 +4,7 @@
 #include <string>
 #include <vector>
 
+#include "common/TestImages.h"
 #include "holograms/HologramsRemove.h"
 #include "imagelib/CImage.h"
 #include "imagelib/Trace.h"
@@ -23,15 +24,8 @@ struct Random {
     int Below(int n) { return static_cast<int>(Next() % static_cast<uint32_t>(n)); }
 };
 
-inline CImage RandomImage(int w, int h, int bits, uint32_t seed, int low = 0, int high = 255) {
-    CImage img(w, h, bits);
-    Random rnd(seed);
-    for (int y = 0; y < h; ++y) {
-        unsigned char* p = img.GetPtrXY(0, y);
-        for (int i = 0; i < w * bits / 8; ++i) p[i] = static_cast<unsigned char>(low + rnd.Below(high - low + 1));
-    }
-    return img;
-}
+using testing_images::RandomImage;
+using testing_images::SamePixels;
 
 inline CImage Solid24(int w, int h, int b, int g, int r) {
     CImage img(w, h, 24);
@@ -57,17 +51,6 @@ inline std::vector<int> Px(const CImage& img, int x, int y) {
     std::vector<int> v;
     for (int c = 0; c < img.GetBitCount() / 8; ++c) v.push_back(p[c]);
     return v;
-}
-
-// Pixel bytes equal (padding ignored).
-inline bool SamePixels(const CImage& a, const CImage& b) {
-    if (a.GetWidth() != b.GetWidth() || a.GetHeight() != b.GetHeight() || a.GetBitCount() != b.GetBitCount())
-        return false;
-    const int n = a.GetWidth() * a.GetBitCount() / 8;
-    for (int y = 0; y < a.GetHeight(); ++y)
-        for (int i = 0; i < n; ++i)
-            if (a.GetPtrXY(0, y)[i] != b.GetPtrXY(0, y)[i]) return false;
-    return true;
 }
 
 inline int CountMarked(const CImage& map) {
