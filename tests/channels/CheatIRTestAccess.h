@@ -6,11 +6,11 @@
 #include <cstdlib>
 #include <deque>
 #include <filesystem>
-#include <random>
 #include <string>
 
 #include "channels/CheatIR.h"
 #include "channels/CheatIRInternal.h"
+#include "common/TestImages.h"
 
 class CCheatIRTestAccess {
 public:
@@ -52,13 +52,7 @@ inline uint8_t At(const CImage& img, int x, int y) { return img.GetPtrXY(0, y)[x
 inline uint16_t Label(const CImage& img, int x, int y) { return channels::RowU16(img, y)[x]; }
 inline int16_t Deriv(const CImage& img, int x, int y) { return channels::Row16(img, y)[x]; }
 
-inline CImage Noise(int w, int h, unsigned seed) {
-    CImage img(w, h, 8);
-    std::mt19937 random(seed);
-    for (int y = 0; y < h; ++y)
-        for (int x = 0; x < w; ++x) img.GetPtrXY(0, y)[x] = static_cast<uint8_t>(random());
-    return img;
-}
+inline CImage Noise(int w, int h, unsigned seed) { return testing_images::RandomImage(w, h, 8, seed); }
 
 // Debug pictures go to a fresh temporary folder while this lives.
 class DumpDir {
@@ -85,14 +79,6 @@ inline bool AllBytes(const CImage& img, uint8_t v) {
     return true;
 }
 
-inline bool SamePixels(const CImage& a, const CImage& b) {
-    if (a.GetWidth() != b.GetWidth() || a.GetHeight() != b.GetHeight() || a.GetBitCount() != b.GetBitCount())
-        return false;
-    const int bytes = a.GetWidth() * a.GetBitCount() / 8;
-    for (int y = 0; y < a.GetHeight(); ++y)
-        for (int i = 0; i < bytes; ++i)
-            if (a.GetPtrXY(0, y)[i] != b.GetPtrXY(0, y)[i]) return false;
-    return true;
-}
+using testing_images::SamePixels;
 
 }  // namespace testpics
