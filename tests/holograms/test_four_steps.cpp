@@ -24,17 +24,9 @@ void RunSteps(CHologramsRemove& r, const CImage* const images[4], CImage& result
 }
 
 Bgr Decide(Stats& s, const Bgr d[4]) {
-    unsigned char bytes[4][3];
-    const unsigned char* detail[4];
-    for (int i = 0; i < 4; ++i) {
-        bytes[i][0] = static_cast<unsigned char>(d[i].b);
-        bytes[i][1] = static_cast<unsigned char>(d[i].g);
-        bytes[i][2] = static_cast<unsigned char>(d[i].r);
-        detail[i] = bytes[i];
-    }
-    unsigned char out[3];
-    holo4::DecideStepPixel(s.st, detail, out);
-    return {out[0], out[1], out[2]};
+    return ApplyPixelRule(d, [&](const unsigned char* const detail[4], unsigned char* out) {
+        holo4::DecideStepPixel(s.st, detail, out);
+    });
 }
 
 }  // namespace

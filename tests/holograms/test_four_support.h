@@ -34,14 +34,16 @@ struct Bgr {
     int b, g, r;
 };
 
+inline void Put(CImage& img, int x, int y, Bgr c) {
+    unsigned char* p = img.GetPtrXY(x, y);
+    p[0] = static_cast<unsigned char>(c.b);
+    p[1] = static_cast<unsigned char>(c.g);
+    p[2] = static_cast<unsigned char>(c.r);
+}
+
 inline void Fill(CImage& img, Bgr c) {
     for (int y = 0; y < img.GetHeight(); ++y)
-        for (int x = 0; x < img.GetWidth(); ++x) {
-            unsigned char* p = img.GetPtrXY(x, y);
-            p[0] = static_cast<unsigned char>(c.b);
-            p[1] = static_cast<unsigned char>(c.g);
-            p[2] = static_cast<unsigned char>(c.r);
-        }
+        for (int x = 0; x < img.GetWidth(); ++x) Put(img, x, y, c);
 }
 
 inline CImage Solid(int w, int h, Bgr c) {
@@ -50,11 +52,21 @@ inline CImage Solid(int w, int h, Bgr c) {
     return img;
 }
 
-inline void Put(CImage& img, int x, int y, Bgr c) {
-    unsigned char* p = img.GetPtrXY(x, y);
-    p[0] = static_cast<unsigned char>(c.b);
-    p[1] = static_cast<unsigned char>(c.g);
-    p[2] = static_cast<unsigned char>(c.r);
+// Runs a per-pixel rule rule(const unsigned char* const detail[4], unsigned char* out) on the
+// four candidates d and returns the pixel it writes.
+template <class Rule>
+Bgr ApplyPixelRule(const Bgr d[4], Rule rule) {
+    unsigned char bytes[4][3];
+    const unsigned char* detail[4];
+    for (int i = 0; i < 4; ++i) {
+        bytes[i][0] = static_cast<unsigned char>(d[i].b);
+        bytes[i][1] = static_cast<unsigned char>(d[i].g);
+        bytes[i][2] = static_cast<unsigned char>(d[i].r);
+        detail[i] = bytes[i];
+    }
+    unsigned char out[3];
+    rule(detail, out);
+    return {out[0], out[1], out[2]};
 }
 
 inline Bgr At(const CImage& img, int x, int y) {
