@@ -9,12 +9,6 @@ using namespace two_test;
 
 namespace {
 
-CImage Grey(int w, int h, int value) {
-    CImage img(w, h, 8);
-    img.Set(static_cast<unsigned char>(value));
-    return img;
-}
-
 // A 3 x 3 blob at (4..6, 4..6): its centre has eight glare neighbours, the other eight pixels
 // form the rim.
 CImage SquareMask(int w, int h) {

@@ -27,15 +27,9 @@ struct Random {
 using testing_images::RandomImage;
 using testing_images::SamePixels;
 
-inline CImage Solid24(int w, int h, int b, int g, int r) {
-    CImage img(w, h, 24);
-    for (int y = 0; y < h; ++y)
-        for (int x = 0; x < w; ++x) {
-            unsigned char* p = img.GetPtrXY(x, y);
-            p[0] = static_cast<unsigned char>(b);
-            p[1] = static_cast<unsigned char>(g);
-            p[2] = static_cast<unsigned char>(r);
-        }
+inline CImage Grey(int w, int h, int value) {
+    CImage img(w, h, 8);
+    img.Set(static_cast<unsigned char>(value));
     return img;
 }
 
@@ -44,6 +38,13 @@ inline void Put24(CImage& img, int x, int y, int b, int g, int r) {
     p[0] = static_cast<unsigned char>(b);
     p[1] = static_cast<unsigned char>(g);
     p[2] = static_cast<unsigned char>(r);
+}
+
+inline CImage Solid24(int w, int h, int b, int g, int r) {
+    CImage img(w, h, 24);
+    for (int y = 0; y < h; ++y)
+        for (int x = 0; x < w; ++x) Put24(img, x, y, b, g, r);
+    return img;
 }
 
 inline std::vector<int> Px(const CImage& img, int x, int y) {

@@ -6,16 +6,6 @@
 
 using namespace two_test;
 
-namespace {
-
-CImage Grey(int w, int h, int value) {
-    CImage img(w, h, 8);
-    img.Set(static_cast<unsigned char>(value));
-    return img;
-}
-
-}  // namespace
-
 TEST(TwoVotes, IdenticalShotsMarkNothing) {
     CHologramsRemove remover;
     CImage image = RandomImage(40, 40, 8, 21, 90, 250), average, image2 = image, average2, map1, map2;
