@@ -327,19 +327,38 @@ bool IsGlare(const unsigned char* pixel, const unsigned char* truthPixel) {
     return m - t >= kGlareExcess || (nearWhite && t < 250);
 }
 
+namespace {
+
+// A 24-bit image of the scene's size.
+bool FitsScene(const Scene& scene, const CImage& image) {
+    return image.GetWidth() == scene.truth.GetWidth() && image.GetHeight() == scene.truth.GetHeight() &&
+           image.GetBitCount() == 24;
+}
+
+// Row y of the scene's glare bits, document mask and truth, and of the image measured.
+struct ScoredRows {
+    const unsigned char* g;
+    const unsigned char* d;
+    const unsigned char* t;
+    const unsigned char* p;
+
+    ScoredRows(const Scene& scene, const CImage& image, int y)
+        : g(scene.glare.GetPtrXY(0, y)), d(scene.document.GetPtrXY(0, y)), t(scene.truth.GetPtrXY(0, y)),
+          p(image.GetPtrXY(0, y)) {}
+};
+
+}  // namespace
+
 double GlareShare(const Scene& scene, const CImage& image) {
+    if (!FitsScene(scene, image)) return 1.0;
     const int w = scene.truth.GetWidth(), h = scene.truth.GetHeight();
-    if (image.GetWidth() != w || image.GetHeight() != h || image.GetBitCount() != 24) return 1.0;
     long glaring = 0, still = 0;
     for (int y = 0; y < h; ++y) {
-        const unsigned char* g = scene.glare.GetPtrXY(0, y);
-        const unsigned char* d = scene.document.GetPtrXY(0, y);
-        const unsigned char* t = scene.truth.GetPtrXY(0, y);
-        const unsigned char* p = image.GetPtrXY(0, y);
+        const ScoredRows r(scene, image, y);
         for (int x = 0; x < w; ++x) {
-            if (!g[x] || !d[x]) continue;
+            if (!r.g[x] || !r.d[x]) continue;
             ++glaring;
-            if (IsGlare(p + 3 * x, t + 3 * x)) ++still;
+            if (IsGlare(r.p + 3 * x, r.t + 3 * x)) ++still;
         }
     }
     return glaring ? static_cast<double>(still) / glaring : 0.0;
@@ -347,26 +366,23 @@ double GlareShare(const Scene& scene, const CImage& image) {
 
 Quality Evaluate(const Scene& scene, const CImage& result) {
     Quality q;
-    const int w = scene.truth.GetWidth(), h = scene.truth.GetHeight();
-    if (result.GetWidth() != w || result.GetHeight() != h || result.GetBitCount() != 24) {
+    if (!FitsScene(scene, result)) {
         q.glareRemaining = 1.0;
         return q;
     }
+    const int w = scene.truth.GetWidth(), h = scene.truth.GetHeight();
     double sumSq = 0.0;
     long samples = 0;
     for (int y = 0; y < h; ++y) {
-        const unsigned char* g = scene.glare.GetPtrXY(0, y);
-        const unsigned char* d = scene.document.GetPtrXY(0, y);
-        const unsigned char* t = scene.truth.GetPtrXY(0, y);
-        const unsigned char* p = result.GetPtrXY(0, y);
+        const ScoredRows r(scene, result, y);
         for (int x = 0; x < w; ++x) {
-            if (!d[x]) continue;
+            if (!r.d[x]) continue;
             for (int c = 0; c < 3; ++c) {
-                const double e = static_cast<double>(p[3 * x + c]) - t[3 * x + c];
+                const double e = static_cast<double>(r.p[3 * x + c]) - r.t[3 * x + c];
                 sumSq += e * e;
             }
             samples += 3;
-            if (g[x]) ++q.glarePixels;
+            if (r.g[x]) ++q.glarePixels;
         }
     }
     const double mse = samples ? sumSq / samples : 0.0;
