@@ -93,6 +93,13 @@ Planes& Page() {
     return planes;
 }
 
+// Points graded over all segments.
+size_t TotalPoints(const std::vector<SSegmentGrades>& grades) {
+    size_t points = 0;
+    for (const SSegmentGrades& g : grades) points += static_cast<size_t>(g.pointCount);
+    return points;
+}
+
 void BM_CheatCreate(benchmark::State& state) {
     Planes& planes = Page();
     CCheatIR cheat;
@@ -112,10 +119,8 @@ void BM_MatchChannels(benchmark::State& state) {
         cheat.MatchChannels(planes.p, &grades);
         benchmark::DoNotOptimize(grades.data());
     }
-    size_t points = 0;
-    for (const SSegmentGrades& g : grades) points += static_cast<size_t>(g.pointCount);
     state.counters["segments"] = static_cast<double>(grades.size());
-    state.counters["points"] = static_cast<double>(points);
+    state.counters["points"] = static_cast<double>(TotalPoints(grades));
     state.SetLabel("A4 2480x3508, no dumps");
 }
 BENCHMARK(BM_MatchChannels)->Unit(benchmark::kMillisecond);
@@ -150,9 +155,7 @@ void BM_MatchChannelsBand(benchmark::State& state) {
     for (auto _ : state) benchmark::DoNotOptimize(cheat.MatchChannels(planes.p, &grades));
     unsetenv("VARNOTH_DUMP_DIR");
     std::filesystem::remove_all(dir);
-    size_t points = 0;
-    for (const SSegmentGrades& g : grades) points += static_cast<size_t>(g.pointCount);
-    state.counters["points"] = static_cast<double>(points);
+    state.counters["points"] = static_cast<double>(TotalPoints(grades));
     state.SetLabel(state.range(0) != 0 ? "620x440, dumps on" : "620x440, no dumps");
 }
 BENCHMARK(BM_MatchChannelsBand)->Arg(0)->Arg(1)->ArgName("dumps")->Unit(benchmark::kMillisecond)->Iterations(1);
