@@ -164,21 +164,16 @@ void FirstPass(const holo4::CandidatePyramids& c, int level, LevelPlanes& planes
             uint32_t* hv = hs + 256;
             for (int y = static_cast<int>(static_cast<int64_t>(h) * band / kBands);
                  y < static_cast<int>(static_cast<int64_t>(h) * (band + 1) / kBands); ++y) {
-                const unsigned char* lapRow[4];
-                const unsigned char* brightRow[4];
-                for (int i = 0; i < 4; ++i) {
-                    lapRow[i] = c.laplacian[i].GetLevel(level).GetPtrXY(0, y);
-                    brightRow[i] = c.brightness[i][level].GetPtrXY(0, y);
-                }
+                const holo4::CandidateLevelRows rows(c, level, y);
                 const size_t rowStart = static_cast<size_t>(y) * w;
-                for (int i = 0; i < 4; ++i) holo4::RgbToHsvRowFast(lapRow[i], &planes.hsv[i][3 * rowStart], w);
+                for (int i = 0; i < 4; ++i) holo4::RgbToHsvRowFast(rows.lap[i], &planes.hsv[i][3 * rowStart], w);
                 for (int x = 0; x < w; ++x) {
                     const size_t at = rowStart + x;
                     const unsigned char* hsv[4];
                     bool saturated[4];
                     for (int i = 0; i < 4; ++i) {
                         hsv[i] = &planes.hsv[i][3 * at];
-                        saturated[i] = holo4::IsHsvSaturated(brightRow[i][x]);
+                        saturated[i] = holo4::IsHsvSaturated(rows.bright[i][x]);
                     }
                     // Pixels where every shot is saturated have no spread and stay out.
                     const holo4::Spreads s = holo4::SpreadsOf(hsv, saturated);
@@ -201,21 +196,17 @@ void SecondPass(const holo4::CandidatePyramids& c, int level, const LevelPlanes&
     const int w = planes.width;
     holo4::ForEachRowBand(planes.height, [&](int begin, int end) {
         for (int y = begin; y < end; ++y) {
-            const unsigned char* lapRow[4];
-            const unsigned char* brightRow[4];
-            for (int i = 0; i < 4; ++i) {
-                lapRow[i] = c.laplacian[i].GetLevel(level).GetPtrXY(0, y);
-                brightRow[i] = c.brightness[i][level].GetPtrXY(0, y);
-            }
+            const holo4::CandidateLevelRows rows(c, level, y);
             unsigned char* outRow = out.GetPtrXY(0, y);
             for (int x = 0; x < w; ++x) {
                 const size_t at = static_cast<size_t>(y) * w + x;
-                const unsigned char* detail[4] = {lapRow[0] + 3 * x, lapRow[1] + 3 * x, lapRow[2] + 3 * x,
-                                                  lapRow[3] + 3 * x};
+                const unsigned char* detail[4] = {rows.lap[0] + 3 * x, rows.lap[1] + 3 * x, rows.lap[2] + 3 * x,
+                                                  rows.lap[3] + 3 * x};
                 const unsigned char* hsv[4] = {&planes.hsv[0][3 * at], &planes.hsv[1][3 * at],
                                                &planes.hsv[2][3 * at], &planes.hsv[3][3 * at]};
-                const bool masked[4] = {holo4::IsHsvSaturated(brightRow[0][x]), holo4::IsHsvSaturated(brightRow[1][x]),
-                                        holo4::IsHsvSaturated(brightRow[2][x]), holo4::IsHsvSaturated(brightRow[3][x])};
+                const bool masked[4] = {
+                    holo4::IsHsvSaturated(rows.bright[0][x]), holo4::IsHsvSaturated(rows.bright[1][x]),
+                    holo4::IsHsvSaturated(rows.bright[2][x]), holo4::IsHsvSaturated(rows.bright[3][x])};
                 holo4::DecidePixel(detail, hsv, masked, ts, tv, outRow + 3 * x);
             }
         }

@@ -170,13 +170,8 @@ void ComposeLevel(CPyramid& result, const holo4::CandidatePyramids& c, int level
     const int height = c.laplacian[0].GetLevel(level).GetHeight();
     holo4::ForEachRowBand(height, [&](int begin, int end) {
         for (int y = begin; y < end; ++y) {
-            const unsigned char* lap[4];
-            const unsigned char* bright[4];
-            for (int i = 0; i < 4; ++i) {
-                lap[i] = c.laplacian[i].GetLevel(level).GetPtrXY(0, y);
-                bright[i] = c.brightness[i][level].GetPtrXY(0, y);
-            }
-            rowRule(lap, bright, result.GetLevel(level).GetPtrXY(0, y), width);
+            const holo4::CandidateLevelRows rows(c, level, y);
+            rowRule(rows.lap, rows.bright, result.GetLevel(level).GetPtrXY(0, y), width);
         }
     });
 }

@@ -21,6 +21,19 @@ struct CandidatePyramids {
 };
 void BuildCandidatePyramids(const CImage* const images[4], CandidatePyramids& pyramids);
 
+// Row y of one level of the four candidates: the Laplacian rows and the brightness rows.
+struct CandidateLevelRows {
+    const unsigned char* lap[4];
+    const unsigned char* bright[4];
+
+    CandidateLevelRows(const CandidatePyramids& c, int level, int y) {
+        for (int i = 0; i < 4; ++i) {
+            lap[i] = c.laplacian[i].GetLevel(level).GetPtrXY(0, y);
+            bright[i] = c.brightness[i][level].GetPtrXY(0, y);
+        }
+    }
+};
+
 // out[x] = largest channel of 24-bit pixel x; plain [begin, end) and fast whole-row forms.
 void BrightnessRow(const unsigned char* pixels, unsigned char* out, int begin, int end);
 void BrightnessRowFast(const unsigned char* pixels, unsigned char* out, int width);
