@@ -45,15 +45,22 @@ inline unsigned char RepairDarker(int average, int otherExcess, int difference, 
     return ClampByte(average + v);
 }
 
+// Shots, averages, maps and difference of one 24-bit size, and a window of 0 or more.
+bool RepairInputsValid(const wchar_t* name, std::initializer_list<const CImage*> images, int window) {
+    if (!AllSame24(images) && Refuse(name, "images, averages, maps and difference must be 24-bit of one size"))
+        return false;
+    if (window < 0 && Refuse(name, "negative window")) return false;
+    return true;
+}
+
 }  // namespace
 }  // namespace holo
 
 void CHologramsRemove::CollectHologramsPixels_New(CImage& image1, CImage& average1, CImage& image2, CImage& average2,
                                                   CImage& map1, CImage& map2, CImage& difference, int window) {
-    if (!holo::AllSame24({&image1, &average1, &image2, &average2, &map1, &map2, &difference}) &&
-        Refuse(L"CollectHologramsPixels_New", "images, averages, maps and difference must be 24-bit of one size"))
+    if (!holo::RepairInputsValid(L"CollectHologramsPixels_New", {&image1, &average1, &image2, &average2, &map1, &map2, &difference},
+                                 window))
         return;
-    if (window < 0 && Refuse(L"CollectHologramsPixels_New", "negative window")) return;
     m_holoPixels.SetSize(0);
     const int half = window / 2;
     const int width = image1.GetWidth();
@@ -137,10 +144,9 @@ void CHologramsRemove::FixRealImages_24_New(CImage& image1, CImage& image2, int 
 
 void CHologramsRemove::FixSmlImages_24_New(CImage& image1, CImage& average1, CImage& image2, CImage& average2,
                                            CImage& map1, CImage& map2, CImage& difference, int window) {
-    if (!holo::AllSame24({&image1, &average1, &image2, &average2, &map1, &map2, &difference}) &&
-        Refuse(L"FixSmlImages_24_New", "images, averages, maps and difference must be 24-bit of one size"))
+    if (!holo::RepairInputsValid(L"FixSmlImages_24_New", {&image1, &average1, &image2, &average2, &map1, &map2, &difference},
+                                 window))
         return;
-    if (window < 0 && Refuse(L"FixSmlImages_24_New", "negative window")) return;
     const int half = window / 2;
     const int width = image1.GetWidth();
     const int height = image1.GetHeight();
