@@ -10,21 +10,17 @@ using namespace four_test;
 
 namespace {
 
-Bgr Hsv(Bgr rgb) {
+// One pixel through the remover's in-place colour conversion.
+Bgr Converted(Bgr in, void (*convert)(CHologramsRemove&, unsigned char*)) {
     CHologramsRemove r;
-    unsigned char p[3] = {static_cast<unsigned char>(rgb.b), static_cast<unsigned char>(rgb.g),
-                          static_cast<unsigned char>(rgb.r)};
-    HologramsRemoveTestAccess::Rgb2Hsv(r, p);
+    unsigned char p[3] = {static_cast<unsigned char>(in.b), static_cast<unsigned char>(in.g),
+                          static_cast<unsigned char>(in.r)};
+    convert(r, p);
     return {p[0], p[1], p[2]};
 }
 
-Bgr Rgb(Bgr hsv) {  // b = H, g = S, r = V
-    CHologramsRemove r;
-    unsigned char p[3] = {static_cast<unsigned char>(hsv.b), static_cast<unsigned char>(hsv.g),
-                          static_cast<unsigned char>(hsv.r)};
-    HologramsRemoveTestAccess::Hsv2Rgb(r, p);
-    return {p[0], p[1], p[2]};
-}
+Bgr Hsv(Bgr rgb) { return Converted(rgb, HologramsRemoveTestAccess::Rgb2Hsv); }
+Bgr Rgb(Bgr hsv) { return Converted(hsv, HologramsRemoveTestAccess::Hsv2Rgb); }  // b = H, g = S, r = V
 
 }  // namespace
 
