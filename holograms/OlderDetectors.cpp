@@ -67,20 +67,29 @@ struct VoteRows : ShotRows {
 };
 
 struct Verdict {
-    bool candidate1, candidate2, bright1, bright2;
+    bool candidate1, candidate2;
     int votes1, votes2, similar;
+
+    // A candidate is bright, not clearly darker than the other shot and more than `excess`
+    // above its local average.
+    Verdict(int p1, int p2, int average1, int average2, int excess)
+        : candidate1(p1 >= 96 && p2 - p1 < 8 && p1 - average1 > excess),
+          candidate2(p2 >= 96 && p1 - p2 < 8 && p2 - average2 > excess), votes1(0), votes2(0), similar(0) {}
 };
 
-// Marks the pixel by the bright and strong rules; counts strong glare inside the document rows.
-void MarkVerdict(const Verdict& v, unsigned char& mark1, unsigned char& mark2, bool inRows, int& count1,
-                 int& count2) {
+// Marks the pixel (shot values p1, p2) by the bright and strong rules; counts strong glare
+// inside the document rows.
+void MarkVerdict(const Verdict& v, int p1, int p2, unsigned char& mark1, unsigned char& mark2, bool inRows,
+                 int& count1, int& count2) {
+    const bool bright1 = p1 >= 240 && p2 <= 230;
+    const bool bright2 = p2 >= 240 && p1 <= 230;
     const bool strong1 = v.candidate1 && v.votes1 >= 8 && v.similar < 6;
     const bool strong2 = v.candidate2 && v.votes2 >= 8 && v.similar < 6;
-    if ((v.bright1 && !v.bright2) || strong1) {
+    if ((bright1 && !bright2) || strong1) {
         if (mark1 == 0) mark1 = 250;
         if (strong1 && inRows) ++count1;
     }
-    if ((v.bright2 && !v.bright1) || strong2) {
+    if ((bright2 && !bright1) || strong2) {
         if (mark2 == 0) mark2 = 250;
         if (strong2 && inRows) ++count2;
     }
@@ -107,19 +116,17 @@ void CHologramsRemove::SubImg_8(CImage& image1, CImage& image2, CImage& output, 
 void CHologramsRemove::FindHologramsPixels_8(CImage& image1, CImage& average1, CImage& image2, CImage& average2,
                                              CImage& map1, CImage& map2, int radius, int topRow, int bottomRow,
                                              int& count1, int& count2) {
-    holo::ShotImages v{image1, average1, image2, average2, map1, map2};
-    if (!holo::PrepareVote(L"FindHologramsPixels_8", 8, v, radius, count1, count2)) return;
+    holo::ShotImages shots{image1, average1, image2, average2, map1, map2};
+    if (!holo::PrepareVote(L"FindHologramsPixels_8", 8, shots, radius, count1, count2)) return;
     const auto at = holo::VoteNeighbours(radius);
     const int height = image1.GetHeight();
     const int span = image1.GetSpan();  // the padding of each row takes part like pixels
     for (int y = radius; y < height - radius; ++y) {
-        const holo::VoteRows r(v, y, at);
+        const holo::VoteRows r(shots, y, at);
         for (int x = radius; x < span - radius; ++x) {
             const int p1 = r.i1[x];
             const int p2 = r.i2[x];
-            holo::Verdict v{};
-            v.candidate1 = p1 >= 96 && p2 - p1 < 8 && p1 - r.a1[x] > 10;
-            v.candidate2 = p2 >= 96 && p1 - p2 < 8 && p2 - r.a2[x] > 10;
+            holo::Verdict v(p1, p2, r.a1[x], r.a2[x], 10);
             if (!v.candidate1 && !v.candidate2) continue;
             bool aborted = false;
             for (size_t k = 0; k < at.size() && !aborted; ++k) {
@@ -136,9 +143,7 @@ void CHologramsRemove::FindHologramsPixels_8(CImage& image1, CImage& average1, C
                 r.m2[x] = 0;
                 continue;
             }
-            v.bright1 = p1 >= 240 && p2 <= 230;
-            v.bright2 = p2 >= 240 && p1 <= 230;
-            holo::MarkVerdict(v, r.m1[x], r.m2[x], topRow < y && y < bottomRow, count1, count2);
+            holo::MarkVerdict(v, p1, p2, r.m1[x], r.m2[x], topRow < y && y < bottomRow, count1, count2);
         }
     }
     Trace(L"img1HologramPixels=%4d  - img2HologramPixels=%4d\n", count1, count2);
@@ -147,20 +152,18 @@ void CHologramsRemove::FindHologramsPixels_8(CImage& image1, CImage& average1, C
 void CHologramsRemove::FindHologramsPixels_24(CImage& image1, CImage& average1, CImage& image2, CImage& average2,
                                               CImage& map1, CImage& map2, int radius, int topRow, int bottomRow,
                                               int& count1, int& count2) {
-    holo::ShotImages v{image1, average1, image2, average2, map1, map2};
-    if (!holo::PrepareVote(L"FindHologramsPixels_24", 24, v, radius, count1, count2)) return;
+    holo::ShotImages shots{image1, average1, image2, average2, map1, map2};
+    if (!holo::PrepareVote(L"FindHologramsPixels_24", 24, shots, radius, count1, count2)) return;
     const auto at = holo::VoteNeighbours(radius);
     const int height = image1.GetHeight();
     const int span = image1.GetSpan();  // the padding of each row takes part like sub-pixels
     for (int y = radius; y < height - radius; ++y) {
-        const holo::VoteRows r(v, y, at);
+        const holo::VoteRows r(shots, y, at);
         for (int i = 3 * radius; i < span - 3 * radius; ++i) {
             const int pixel = i / 3;  // the three channels share one mask byte
             const int p1 = r.i1[i];
             const int p2 = r.i2[i];
-            holo::Verdict v{};
-            v.candidate1 = p1 >= 96 && p2 - p1 < 8 && p1 - r.a1[i] > 20;
-            v.candidate2 = p2 >= 96 && p1 - p2 < 8 && p2 - r.a2[i] > 20;
+            holo::Verdict v(p1, p2, r.a1[i], r.a2[i], 20);
             if (!v.candidate1 && !v.candidate2) continue;
             bool aborted = false;
             int steep1 = 0, steep2 = 0;
@@ -183,9 +186,7 @@ void CHologramsRemove::FindHologramsPixels_24(CImage& image1, CImage& average1, 
                 i = 3 * pixel + 2;  // skip the pixel's remaining channels
                 continue;
             }
-            v.bright1 = p1 >= 240 && p2 <= 230;
-            v.bright2 = p2 >= 240 && p1 <= 230;
-            holo::MarkVerdict(v, r.m1[pixel], r.m2[pixel], topRow < y && y < bottomRow, count1, count2);
+            holo::MarkVerdict(v, p1, p2, r.m1[pixel], r.m2[pixel], topRow < y && y < bottomRow, count1, count2);
         }
     }
     Trace(L"img1HologramPixels=%4d  - img2HologramPixels=%4d\n", count1, count2);
