@@ -22,5 +22,7 @@ install(FILES ${CMAKE_CURRENT_BINARY_DIR}/Varnoth64Config.cmake
   ${CMAKE_CURRENT_BINARY_DIR}/Varnoth64ConfigVersion.cmake
   DESTINATION ${CMAKE_INSTALL_LIBDIR}/cmake/Varnoth64)
 
+# The .pc file finds the prefix from its own place, so an install moved with --prefix still works.
+file(RELATIVE_PATH VARNOTH_PC_TO_PREFIX "/${CMAKE_INSTALL_LIBDIR}/pkgconfig" "/")
 configure_file(cmake/varnoth64.pc.in ${CMAKE_CURRENT_BINARY_DIR}/varnoth64.pc @ONLY)
 install(FILES ${CMAKE_CURRENT_BINARY_DIR}/varnoth64.pc DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig)
