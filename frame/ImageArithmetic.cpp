@@ -6,6 +6,7 @@
 #include <hwy/highway.h>
 
 #include <algorithm>
+#include <cstdint>
 #include <cstring>
 
 #include "frame/ArithmeticInternal.h"
@@ -131,7 +132,10 @@ void ImageStretch(CImage& img, int, int) {
 
 bool InsertImage(const CImage& src, CImage& dst, CPoint pos, const CImage* mask) {
     if (pos.x < 0 || pos.y < 0) return false;
-    if (src.GetWidth() + pos.x >= dst.GetWidth() || src.GetHeight() + pos.y >= dst.GetHeight()) return false;
+    // In 64 bits: a position near INT_MAX must not wrap round into one that seems to fit.
+    if (int64_t{src.GetWidth()} + pos.x >= dst.GetWidth() ||
+        int64_t{src.GetHeight()} + pos.y >= dst.GetHeight())
+        return false;
     if (src.GetBitCount() != dst.GetBitCount()) return false;
     if (mask != nullptr && !varnoth::SameGeometry(*mask, src)) return false;
     const size_t n = static_cast<size_t>(src.GetWidth()) * (dst.GetBitCount() / 8);

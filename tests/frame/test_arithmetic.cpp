@@ -1,5 +1,6 @@
 #include <gtest/gtest.h>
 
+#include <cstdint>
 #include <vector>
 
 #include "common/TestImages.h"
@@ -107,5 +108,8 @@ TEST(InsertImage, StaysOnePixelInsideAndHonoursTheMask) {
     EXPECT_FALSE(InsertImage(src, dst2, CPoint(0, 0), &wrongMask));
     CImage grey(3, 2, 8);
     EXPECT_FALSE(InsertImage(grey, dst2, CPoint(0, 0)));
+    // Positions so large that width + x would wrap past INT_MAX are refused, not written.
+    EXPECT_FALSE(InsertImage(src, dst2, CPoint(INT32_MAX, 0)));
+    EXPECT_FALSE(InsertImage(src, dst2, CPoint(0, INT32_MAX - 1)));
     EXPECT_FALSE(IsMMXSuported());
 }
