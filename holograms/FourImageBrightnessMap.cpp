@@ -221,8 +221,8 @@ void CHologramsRemove::HologramsRemove4Img2(const CImage& top, const CImage& bot
                                             const CImage& right, CImage& result) {
     if (!holo4::CheckFourInputs(top, bottom, left, right, L"HologramsRemove4Img2", false)) return;
     const int w = top.GetWidth(), h = top.GetHeight();
-    if (w < 4) {
-        Trace(L"HologramsRemove4Img2: %d columns are too few (at least 4); result left unchanged\n", w);
+    if (w < 2) {  // the edge pairs read pixel 1 of every row
+        Trace(L"HologramsRemove4Img2: %d column is too few (at least 2); result left unchanged\n", w);
         return;
     }
     // Built aside so that a result that is also one of the inputs is read intact.

@@ -88,15 +88,20 @@ TEST(FourImageBrightnessMap, ClosestProportionsWinAndBlackHasNone) {
 
 TEST(FourImageBrightnessMap, NarrowOrMismatchedInputsAreRefused) {
     CHologramsRemove remover;
-    const CImage narrow = RandomImage(3, 8, 24, 1), a = RandomImage(8, 8, 24, 1), b = RandomImage(8, 9, 24, 1);
+    const CImage narrow = RandomImage(1, 8, 24, 1), a = RandomImage(8, 8, 24, 1), b = RandomImage(8, 9, 24, 1);
     CImage result = Solid(2, 2, {5, 5, 5});
     remover.HologramsRemove4Img2(narrow, narrow, narrow, narrow, result);
     remover.HologramsRemove4Img2(a, a, b, a, result);
     EXPECT_EQ(result.GetWidth(), 2);
+
+    // Two and three columns are only edge pairs, taken from one of the (identical) shots.
+    const CImage thin = RandomImage(3, 9, 24, 2);
+    remover.HologramsRemove4Img2(thin, thin, thin, thin, result);
+    EXPECT_TRUE(SamePixels(result, thin));
 }
 
 TEST(FourImageBrightnessMap, BandedPassMatchesThePlainRasterPass) {
-    for (int size : {4, 5, 37, 71}) {
+    for (int size : {2, 3, 4, 5, 37, 71}) {
         const CImage t = RandomImage(size, size + 30, 24, 11), b = Darkened(RandomImage(size, size + 30, 24, 12));
         const CImage l = Darkened(RandomImage(size, size + 30, 24, 13)), r = RandomImage(size, size + 30, 24, 14);
         const CImage* const in[4] = {&t, &b, &l, &r};
