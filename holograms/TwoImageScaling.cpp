@@ -397,7 +397,8 @@ void CHologramsRemove::FixAvMap_24(CImage& image, CImage& average, CImage& mask,
             for (int c = 0; c < 3; ++c) {
                 const size_t at = cell(x, y, c);
                 if (counts[at] >= area) continue;
-                // Saturates rather than wraps where the 16-bit sum has wrapped.
+                // Saturates rather than keeping the low 8 bits: a sum that wrapped in 16 bits, or few
+                // pixels left over a large remainder, can put the quotient above 255.
                 av[3 * x + c] = holo::ClampByte((sums[at] + area / 2) / counts[at]);
             }
     }
