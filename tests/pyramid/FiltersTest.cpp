@@ -15,6 +15,7 @@
 #endif
 
 using pyramid_test::FillRowPixels;
+using pyramid_test::Flat;
 using pyramid_test::RandomImage;
 using pyramid_test::SameBytes;
 
@@ -24,12 +25,6 @@ namespace {
 CPyramid& Filters() {
     static CPyramid pyramid(1, 512, 512, 3);
     return pyramid;
-}
-
-CImage Flat(int w, int h, int bits, uint8_t value) {
-    CImage image(w, h, bits);
-    image.Set(value);
-    return image;
 }
 
 }  // namespace

@@ -7,6 +7,7 @@
 #include "pyramid/Fusion.h"
 #include "pyramid/PyramidTestUtil.h"
 
+using pyramid_test::Flat;
 using pyramid_test::RandomImage;
 using pyramid_test::SameBytes;
 
@@ -31,12 +32,6 @@ CPyramid Laplacian(const CImage& image, int levels) {
     CPyramid p(levels, image);
     p.MakeLaplacian();
     return p;
-}
-
-CImage Flat(int w, int h, int bits, uint8_t v) {
-    CImage image(w, h, bits);
-    image.Set(v);
-    return image;
 }
 
 }  // namespace

@@ -10,6 +10,13 @@ namespace pyramid_test {
 
 using testing_images::RandomImage;
 
+// Every pixel byte `value`.
+inline CImage Flat(int w, int h, int bits, uint8_t value) {
+    CImage image(w, h, bits);
+    image.Set(value);
+    return image;
+}
+
 // Sets the bytes of image row y (GetPtrXY order) to `values`, repeated for every channel.
 inline void FillRowPixels(CImage& image, int y, std::initializer_list<int> values) {
     const int ch = image.GetBitCount() / 8;
